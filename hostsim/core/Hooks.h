@@ -1,0 +1,32 @@
+// Extension points of the simulator's core that each area fills at static initialisation.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace BrixSim {
+
+// A kernel system-information node: `get` fills exactly `size` bytes of the record of the
+// instance named by `instancePath` (empty for the node's only record), `list` names the
+// instances below it. Both may throw HostCtl::Lib::HostCtlException.
+struct SysinfoNode {
+    std::function<void(const std::vector<std::string>& instancePath, void* buffer, size_t size)> get;
+    std::function<std::vector<std::string>(const std::vector<std::string>& instancePath)> list;
+};
+bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler);
+
+// A file-system type that HostOs::mount/umount can mount. Handlers return 0 or an errno value;
+// `target` is the host path as given. umount offers the target to every type in turn until one
+// answers other than EINVAL (meaning "not mine").
+struct FileSystemType {
+    std::function<int(const std::string& source, const std::string& target, unsigned long flags,
+                      const std::string& data)>
+        mount;
+    std::function<int(const std::string& target)> umount;
+};
+bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler);
+
+}  // namespace BrixSim

@@ -1,0 +1,119 @@
+// The simulated host's state: one SQLite database under the host root, plus the files the host
+// keeps at their host paths below that root. Every platform adapter is a thin layer over this.
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <variant>
+#include <vector>
+
+struct sqlite3;
+struct sqlite3_stmt;
+
+namespace BrixSim {
+
+// A journal or call argument.
+using Value = std::variant<std::nullptr_t, bool, int64_t, std::string, std::vector<std::string>>;
+using Fields = std::vector<std::pair<std::string, Value>>;
+
+// A prepared statement; bind with 1-based indexes, step, read columns.
+class Stmt {
+public:
+    Stmt(sqlite3* db, std::string_view sql);
+    ~Stmt();
+    Stmt(Stmt&& other) noexcept;
+    Stmt(const Stmt&) = delete;
+    Stmt& operator=(const Stmt&) = delete;
+
+    Stmt& Bind(int index, std::string_view text);
+    Stmt& Bind(int index, const char* text) { return Bind(index, std::string_view(text)); }
+    Stmt& Bind(int index, int64_t value);
+    Stmt& Bind(int index, int value) { return Bind(index, static_cast<int64_t>(value)); }
+    Stmt& Bind(int index, bool value) { return Bind(index, static_cast<int64_t>(value)); }
+    Stmt& BindNull(int index);
+
+    // True while a row is available.
+    bool Step();
+    // Runs a statement that returns no rows.
+    void Run();
+    void Reset();
+
+    std::string Text(int column) const;
+    int64_t Int(int column) const;
+    bool IsNull(int column) const;
+
+private:
+    sqlite3* db_;
+    sqlite3_stmt* stmt_ = nullptr;
+};
+
+// One area's tables: created in every host, seeded in a new one. Register at static
+// initialisation with `static const bool registered = BrixSim::RegisterTables({...});`.
+struct TableSet {
+    std::string name;          // the area, e.g. "coredump"
+    std::string schema;        // CREATE TABLE IF NOT EXISTS statements
+    std::function<void(class Store&)> seed;  // fills a new host deterministically; may be empty
+};
+bool RegisterTables(TableSet tables);
+
+// Names of platform operations that can be made to fail, for `brixsim fault ops`.
+bool RegisterOperations(std::initializer_list<const char*> operations);
+
+class Store {
+public:
+    // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
+    // first use; a missing root is created and seeded.
+    static Store& Get();
+    // Closes the process-wide store so the next Get() opens the root named by the environment.
+    static void Close();
+    // The host root as the environment names it (without opening anything).
+    static std::filesystem::path DefaultRoot();
+
+    const std::filesystem::path& Root() const { return root_; }
+    sqlite3* Db() const { return db_; }
+
+    // Maps a host path ("/etc/ostrel/snmp.xml") to its place under the root. Relative paths are
+    // taken from the host's "/". Returns nullopt for a path that would leave the root ("..", or
+    // a symbolic link pointing outside); callers answer such paths with EACCES.
+    std::optional<std::filesystem::path> Resolve(std::string_view hostPath) const;
+
+    // Throws HostCtl::Lib::HostCtlException when a fault is armed for `operation`.
+    void Check(std::string_view operation);
+
+    // Runs `work` in one write transaction (BEGIN IMMEDIATE ... COMMIT), rolled back if it
+    // throws. Nested calls join the outer transaction.
+    void Write(const std::function<void()>& work);
+
+    Stmt Prepare(std::string_view sql) { return Stmt(db_, sql); }
+    void Exec(std::string_view sql);
+
+    // The "host" key-value table, for the host's scalar settings.
+    std::optional<std::string> GetValue(std::string_view key);
+    std::string GetValue(std::string_view key, std::string_view fallback);
+    int64_t GetInt(std::string_view key, int64_t fallback);
+    void SetValue(std::string_view key, std::string_view value);
+    void SetInt(std::string_view key, int64_t value);
+
+    // Appends a record {"kind": kind, fields...} to the journal.
+    void Journal(std::string_view kind, const Fields& fields);
+    // Appends {"kind":"call","op":operation,"args":[...]}.
+    void JournalCall(std::string_view operation, const std::vector<Value>& args);
+
+    ~Store();
+
+private:
+    explicit Store(std::filesystem::path root);
+    void Open();
+    void CreateSchema(bool seed);
+
+    std::filesystem::path root_;
+    sqlite3* db_ = nullptr;
+    int writeDepth_ = 0;
+};
+
+}  // namespace BrixSim

@@ -1,0 +1,25 @@
+// The tool's side of the framework: argument parsing, help, formatting and dispatch.
+#pragma once
+
+#include <iosfwd>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "cmdkit/AutoCli.h"
+
+namespace CmdKit::AutoCli {
+
+// Parses option words against a command's input specification. Throws UsageError with the
+// framework's message for an unknown, repeated (non-list), missing or ill-typed option or a
+// constraint violation.
+std::shared_ptr<CallSpec::Input> ParseArguments(const CallSpec::InputSpec& spec,
+                                                const std::vector<std::string>& args);
+
+// Runs one invocation: `args` are the words after the program name, e.g.
+// {"--formatter=json", "system", "uuid", "get"}. Writes the result to `out`, messages to `err`
+// and returns the exit status (0 ok, 1 the command reported errors, 2 refused by the framework).
+int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
+           std::ostream& out, std::ostream& err);
+
+}  // namespace CmdKit::AutoCli

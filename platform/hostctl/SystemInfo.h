@@ -1,0 +1,26 @@
+// The host's system interface, reached through HostCtl::Host::GetSystemInfo().
+#pragma once
+
+#include <memory>
+#include <string>
+
+namespace HostCtl::System {
+
+class Module;
+class WbemAgentConfig;
+
+class SystemInfo {
+public:
+    SystemInfo();
+    ~SystemInfo();
+
+    // --- identity ---
+    // The install ("inception") time stamp as the host records it.
+    std::string GetInceptionTime();
+
+    // --- modules ---
+
+    // --- agents ---
+};
+
+}  // namespace HostCtl::System
