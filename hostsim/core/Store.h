@@ -5,9 +5,11 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <initializer_list>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <variant>
 #include <vector>
@@ -23,7 +25,7 @@ using Fields = std::vector<std::pair<std::string, Value>>;
 
 // A prepared statement; bind with 1-based indexes, step, read columns.
 class Stmt {
-public:
+  public:
     Stmt(sqlite3* db, std::string_view sql);
     ~Stmt();
     Stmt(Stmt&& other) noexcept;
@@ -35,6 +37,11 @@ public:
     Stmt& Bind(int index, int64_t value);
     Stmt& Bind(int index, int value) { return Bind(index, static_cast<int64_t>(value)); }
     Stmt& Bind(int index, bool value) { return Bind(index, static_cast<int64_t>(value)); }
+    // Any other integer type (long long, unsigned, size_t, ...), stored as a signed 64-bit value.
+    template <class T, class = std::enable_if_t<std::is_integral_v<T>>>
+    Stmt& Bind(int index, T value) {
+        return Bind(index, static_cast<int64_t>(value));
+    }
     Stmt& BindNull(int index);
 
     // True while a row is available.
@@ -47,7 +54,7 @@ public:
     int64_t Int(int column) const;
     bool IsNull(int column) const;
 
-private:
+  private:
     sqlite3* db_;
     sqlite3_stmt* stmt_ = nullptr;
 };
@@ -55,8 +62,8 @@ private:
 // One area's tables: created in every host, seeded in a new one. Register at static
 // initialisation with `static const bool registered = BrixSim::RegisterTables({...});`.
 struct TableSet {
-    std::string name;          // the area, e.g. "coredump"
-    std::string schema;        // CREATE TABLE IF NOT EXISTS statements
+    std::string name;                        // the area, e.g. "coredump"
+    std::string schema;                      // CREATE TABLE IF NOT EXISTS statements
     std::function<void(class Store&)> seed;  // fills a new host deterministically; may be empty
 };
 bool RegisterTables(TableSet tables);
@@ -65,7 +72,7 @@ bool RegisterTables(TableSet tables);
 bool RegisterOperations(std::initializer_list<const char*> operations);
 
 class Store {
-public:
+  public:
     // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
     // first use; a missing root is created and seeded.
     static Store& Get();
@@ -106,7 +113,7 @@ public:
 
     ~Store();
 
-private:
+  private:
     explicit Store(std::filesystem::path root);
     void Open();
     void CreateSchema(bool seed);
