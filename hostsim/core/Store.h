@@ -25,7 +25,7 @@ using Fields = std::vector<std::pair<std::string, Value>>;
 
 // A prepared statement; bind with 1-based indexes, step, read columns.
 class Stmt {
-  public:
+public:
     Stmt(sqlite3* db, std::string_view sql);
     ~Stmt();
     Stmt(Stmt&& other) noexcept;
@@ -54,7 +54,7 @@ class Stmt {
     int64_t Int(int column) const;
     bool IsNull(int column) const;
 
-  private:
+private:
     sqlite3* db_;
     sqlite3_stmt* stmt_ = nullptr;
 };
@@ -62,8 +62,8 @@ class Stmt {
 // One area's tables: created in every host, seeded in a new one. Register at static
 // initialisation with `static const bool registered = BrixSim::RegisterTables({...});`.
 struct TableSet {
-    std::string name;                        // the area, e.g. "coredump"
-    std::string schema;                      // CREATE TABLE IF NOT EXISTS statements
+    std::string name;          // the area, e.g. "coredump"
+    std::string schema;        // CREATE TABLE IF NOT EXISTS statements
     std::function<void(class Store&)> seed;  // fills a new host deterministically; may be empty
 };
 bool RegisterTables(TableSet tables);
@@ -72,7 +72,7 @@ bool RegisterTables(TableSet tables);
 bool RegisterOperations(std::initializer_list<const char*> operations);
 
 class Store {
-  public:
+public:
     // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
     // first use; a missing root is created and seeded.
     static Store& Get();
@@ -113,7 +113,7 @@ class Store {
 
     ~Store();
 
-  private:
+private:
     explicit Store(std::filesystem::path root);
     void Open();
     void CreateSchema(bool seed);
