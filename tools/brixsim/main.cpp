@@ -356,6 +356,9 @@ int Import(const Args& args) {
     }
     try {
         store.Write([&] {
+            // Tables are replaced one after another; references between them are checked
+            // once all are in place.
+            store.Exec("PRAGMA defer_foreign_keys=ON");
             for (const auto& [table, rows] : document["tables"].items()) {
                 store.Exec("DELETE FROM " + Quote(table));
                 for (const auto& row : rows) {
@@ -385,10 +388,10 @@ int Import(const Args& args) {
                         throw;
                     }
                     const int rc = sqlite3_step(stmt);
+                    const std::string error = sqlite3_errmsg(store.Db());
                     sqlite3_finalize(stmt);
                     if (rc != SQLITE_DONE) {
-                        throw std::runtime_error("table \"" + table +
-                                                 "\": " + sqlite3_errmsg(store.Db()));
+                        throw std::runtime_error("table \"" + table + "\": " + error);
                     }
                 }
             }
