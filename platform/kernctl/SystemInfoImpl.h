@@ -28,6 +28,13 @@ public:
     void SetWelcomeMessage(const std::string& text);
 
     // --- maintenance mode and read cache ---
+    // 1 = in maintenance mode, 2 = not in maintenance mode, any other value = unknown.
+    int GetMaintenanceModeState();
+    // The content-based read cache: running now, and configured for the next boot.
+    bool GetCbrcRuntimeEnabled();
+    bool GetCbrcConfiguredEnabled();
+    // Changes the configured state; it takes effect at the next boot.
+    void SetCbrcEnabled(bool enabled);
 
     // --- modules and log levels ---
 

@@ -13,6 +13,16 @@
 #include "identity/WelcomeMessageGet.h"
 #include "identity/WelcomeMessageSet.h"
 // --- identity: host name, clock, maintenance, shutdown, secpolicy ---
+#include "identity/HostnameGet.h"
+#include "identity/HostnameSet.h"
+#include "identity/MaintenanceModeGet.h"
+#include "identity/MaintenanceModeSet.h"
+#include "identity/SecpolicyDomainList.h"
+#include "identity/SecpolicyDomainSet.h"
+#include "identity/Shutdown.h"
+#include "identity/TimeGetSystem.h"
+#include "identity/TimeGetUptime.h"
+#include "identity/TimeSetSystem.h"
 
 // --- coredump ---
 
@@ -128,6 +138,8 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
             "the direction of Ostrel Support Engineers.");
         auto domain = MakeNamespace("Options related to Brixkernel access control security domains.");
         // --- secpolicy domain commands ---
+        domain->RegisterNamespaceNode(SecpolicyDomainList::New(), "list");
+        domain->RegisterNamespaceNode(SecpolicyDomainSet::New(), "set");
         secpolicy->RegisterNamespaceNode(domain, "domain");
         system->RegisterNamespaceNode(secpolicy, "secpolicy");
     }
@@ -169,12 +181,15 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto time = MakeNamespace("Commands to get and set system time.");
         // --- time commands ---
+        time->RegisterNamespaceNode(TimeGetSystem::New(), "get");
+        time->RegisterNamespaceNode(TimeSetSystem::New(), "set");
         system->RegisterNamespaceNode(time, "time");
     }
     {
         auto stats = MakeNamespace("Access to various system statistics");
         auto uptime = MakeNamespace("System uptime, in microseconds");
         // --- stats uptime get ---
+        uptime->RegisterNamespaceNode(TimeGetUptime::New(), "get");
         stats->RegisterNamespaceNode(uptime, "uptime");
         auto installtime =
             MakeNamespace("Commands to get information about software installation.");
@@ -190,6 +205,8 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto hostname = MakeNamespace("Operations pertaining the network name of the Brix host.");
         // --- hostname commands ---
+        hostname->RegisterNamespaceNode(HostnameSet::New(), "set");
+        hostname->RegisterNamespaceNode(HostnameGet::New(), "get");
         system->RegisterNamespaceNode(hostname, "hostname");
     }
     {
@@ -218,11 +235,15 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto shutdown = MakeNamespace("Command to shutdown the system.");
         // --- shutdown commands ---
+        shutdown->RegisterNamespaceNode(Shutdown::New(SHUTDOWN_POWEROFF), "poweroff");
+        shutdown->RegisterNamespaceNode(Shutdown::New(SHUTDOWN_REBOOT), "reboot");
         system->RegisterNamespaceNode(shutdown, "shutdown");
     }
     {
         auto maintenance = MakeNamespace("Command to manage the system's maintenance mode.");
         // --- maintenanceMode commands ---
+        maintenance->RegisterNamespaceNode(MaintenanceModeSet::New(), "set");
+        maintenance->RegisterNamespaceNode(MaintenanceModeGet::New(), "get");
         system->RegisterNamespaceNode(maintenance, "maintenanceMode");
     }
 }
