@@ -67,7 +67,8 @@ TEST(Shutdown, PoweroffWithoutDelay) {
 
 // A '%' in the reason is logged as itself, in the event and in the syslog record.
 TEST(Shutdown, ReasonIsNeverAFormat) {
-    for (const std::string reason : {"%n%s", "100% done %d%%", std::string(512, '%')}) {
+    for (const std::string& reason :
+         std::vector<std::string>{"%n%s", "100% done %d%%", std::string(512, '%')}) {
         SCOPED_TRACE(reason);
         BrixTest::TempHost host;
         EnterMaintenance(host);
