@@ -1,5 +1,7 @@
 #include "identity/TimeGetSystem.h"
 
+#include <cerrno>
+#include <cstring>
 #include <iomanip>
 #include <sstream>
 
@@ -28,6 +30,10 @@ std::shared_ptr<CallSpec::OutputSpec> TimeGetSystem::GetOutputSpecInternal() {
 void TimeGetSystem::ExecuteInternal(InputPtr, OutputPtr output) {
     const time_t now = HostOs::time(nullptr);
     const struct tm* local = HostOs::localtime(&now);
+    if (local == nullptr) {  // a clock beyond what a calendar record can hold
+        Fail(*output, std::strerror(errno));
+        return;
+    }
     // The fields are local time; the trailing "Z" is part of the established output.
     std::ostringstream text;
     text << std::setfill('0') << std::setw(4) << local->tm_year + 1900 << '-' << std::setw(2)
