@@ -1,4 +1,6 @@
 // system time get|set and system stats uptime get on the simulated host's clock.
+#include <cstdlib>
+#include <optional>
 #include <regex>
 
 #include "HostStateTesting.h"
@@ -7,11 +9,31 @@ namespace {
 
 using namespace HostStateTesting;
 
+// Runs the programs in a chosen time zone (they take it from TZ), restoring the old one after.
+class Clock : public testing::Test {
+  protected:
+    void SetUp() override {
+        if (const char* tz = getenv("TZ")) saved_ = tz;
+        Zone("UTC0");
+    }
+    void TearDown() override {
+        if (saved_) {
+            setenv("TZ", saved_->c_str(), 1);
+        } else {
+            unsetenv("TZ");
+        }
+    }
+    static void Zone(const char* tz) { setenv("TZ", tz, 1); }
+
+  private:
+    std::optional<std::string> saved_;
+};
+
 std::string Now(const BrixTest::TempHost& host) {
     return Parsed(Json(host, {"system", "time", "get"})).get<std::string>();
 }
 
-TEST(Clock, GetPrintsLocalTimeWithZ) {
+TEST_F(Clock, GetPrintsLocalTimeWithZ) {
     BrixTest::TempHost host;
     const std::string now = Now(host);
     EXPECT_TRUE(std::regex_match(now, std::regex(R"(\d{4}-\d\d-\d\dT\d\d:\d\d:\d\dZ)"))) << now;
@@ -22,7 +44,7 @@ struct Setting {
     std::string expectedPrefix;  // of the time get shows afterwards, from another process
 };
 
-TEST(Clock, SetNormalisesAndPersists) {
+TEST_F(Clock, SetNormalisesAndPersists) {
     const Setting cases[] = {
         // 31 February 2030 is 3 March.
         {{"--year", "2030", "--month", "2", "--day", "31"}, "2030-03-03T"},
@@ -46,7 +68,7 @@ TEST(Clock, SetNormalisesAndPersists) {
     }
 }
 
-TEST(Clock, UnsetFieldsKeepTheCurrentValue) {
+TEST_F(Clock, UnsetFieldsKeepTheCurrentValue) {
     BrixTest::TempHost host;
     EXPECT_EQ(Parsed(Json(host, {"system", "time", "set", "-y", "2035"})), json(true));
     const std::string after = Now(host);
@@ -60,7 +82,7 @@ struct Refusal {
     std::string message;
 };
 
-TEST(Clock, RefusalsInOrderLeaveTheClock) {
+TEST_F(Clock, RefusalsInOrderLeaveTheClock) {
     const Refusal cases[] = {
         {{}, "You must specify one of year, month, day, hour, minute or second"},
         {{"--year", "1969"}, "Year must be > 1970"},
@@ -95,7 +117,30 @@ TEST(Clock, RefusalsInOrderLeaveTheClock) {
     EXPECT_TRUE(mark.Added({"settimeofday"}).empty());
 }
 
-TEST(Clock, UptimeInMicroseconds) {
+// The fields are local time of the host's zone, printed with a "Z" all the same.
+TEST_F(Clock, GetShowsLocalTime) {
+    BrixTest::TempHost host;
+    ASSERT_EQ(host.Cli({"system", "time", "set", "-y", "2026", "-M", "1", "-d", "5", "-H", "3",
+                        "-m", "4", "-s", "5"})
+                  .status,
+              0);
+    EXPECT_EQ(Now(host).substr(0, 18), "2026-01-05T03:04:0");
+    Zone("XYZ-2");  // two hours east of UTC
+    EXPECT_EQ(Now(host).substr(0, 18), "2026-01-05T05:04:0");
+}
+
+// A time before the clock's origin cannot be set.
+TEST_F(Clock, ClockRefusesTimesBeforeItsOrigin) {
+    BrixTest::TempHost host;
+    Zone("XYZ-5");  // midnight, 1 January 1970 here is 19:00 the day before in UTC
+    JournalMark mark(host);
+    ExpectRefused(
+        host.Cli({"system", "time", "set", "-y", "1970", "-M", "1", "-d", "1", "-H", "0"}),
+        "Unable to set time: Invalid argument");
+    EXPECT_TRUE(mark.Added({"settimeofday"}).empty());
+}
+
+TEST_F(Clock, UptimeInMicroseconds) {
     BrixTest::TempHost host;
     const auto uptime = Parsed(Json(host, {"system", "stats", "uptime", "get"}));
     ASSERT_TRUE(uptime.is_number_integer());

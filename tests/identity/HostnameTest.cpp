@@ -67,9 +67,9 @@ struct Refusal {
 // Nothing is saved for any refused request, also when an earlier name was accepted.
 TEST(Hostname, RefusedRequestsSaveNothing) {
     const std::string badHost =
-        "'. A host name is 1 to 63 letters, digits and '-', and cannot begin or end with '-'.";
+        ". A host name is 1 to 63 letters, digits and '-', and cannot begin or end with '-'.";
     const std::string badDomain =
-        "'. A domain name is labels of 1 to 63 letters, digits and '-' separated by '.'.";
+        ". A domain name is labels of 1 to 63 letters, digits and '-' separated by '.'.";
     // 242 characters of valid labels.
     const std::string label(59, 'd');
     const std::string longDomain = label + "." + label + "." + label + "." + label + ".ab";
@@ -114,24 +114,24 @@ TEST(Hostname, OrderOfChecksAndCalls) {
     host.Fault("KernCtl::Network::DnsConfigImpl::SetFqdn", "setter reached");
     ExpectRefused(host.Cli({"system", "hostname", "set", "-f", "a.example", "-H", "a"}),
                   "You may not specify --host or --domain with --fqdn");
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
 
     host.Fault("KernCtl::Network::DnsConfigImpl::DnsConfigImpl", "no network stack");
     ExpectRefused(host.Cli({"system", "hostname", "set"}), "no network stack");
     ExpectRefused(host.Cli({"system", "hostname", "get"}), "no network stack");
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
 
     // A failing domain after an accepted host name: the host name is not saved either.
     host.Fault("KernCtl::Network::DnsConfigImpl::SetDomain", "domain refused");
     JournalMark mark(host);
     ExpectRefused(host.Cli({"system", "hostname", "set", "-H", "new", "-d", "new.example"}),
                   "domain refused");
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
 
     host.Fault(kSave, "resolver configuration is read-only");
     ExpectRefused(host.Cli({"system", "hostname", "set", "-H", "new"}),
                   "resolver configuration is read-only");
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
     EXPECT_TRUE(mark.Calls(kSave).empty());
     EXPECT_EQ(Parsed(Json(host, {"system", "hostname", "get"})), kSeeded);
 

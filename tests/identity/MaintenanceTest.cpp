@@ -39,6 +39,7 @@ TEST(MaintenanceMode, EnterAndExitRunTheServiceTool) {
     ASSERT_EQ(execs.size(), 1u);
     EXPECT_EQ(execs[0]["argv"], json(Argv("enter", "0", "ensureObjectAccessibility")));
     EXPECT_EQ(execs[0]["status"], 0);
+    EXPECT_FALSE(execs[0]["user"].get<std::string>().empty());
     auto calls = enter.Calls("HostSvc::EnterMaintenanceMode");
     ASSERT_EQ(calls.size(), 1u);
     EXPECT_EQ(calls[0]["args"], json::array({0, "ensureObjectAccessibility"}));
@@ -89,13 +90,11 @@ TEST(MaintenanceMode, FailuresAreReported) {
     auto execs = mark.Added({"exec"});
     ASSERT_EQ(execs.size(), 1u);
     EXPECT_NE(execs[0]["status"], 0);
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
     EXPECT_EQ(State(host), "Disabled");
 
     // A state that cannot be read is reported with its detail, before anything runs.
-    ASSERT_EQ(
-        host.Sim({"fault", "set", kGetState, "state unavailable", "--detail", "hostd busy"}).status,
-        0);
+    host.Fault(kGetState, "state unavailable", 0, "hostd busy");
     JournalMark none(host);
     ExpectRefused(host.Cli({"system", "maintenanceMode", "set", "-e", "true"}),
                   "state unavailable (hostd busy)");
@@ -109,6 +108,7 @@ TEST(MaintenanceMode, FailuresAreReported) {
 // The service tool at the host's /bin/mgmt-cmd, run directly.
 TEST(MaintenanceMode, ServiceToolChecksItsArguments) {
     BrixTest::TempHost host;
+    EXPECT_EQ(State(host), "Disabled");  // makes the host
     const std::string tool = (host.Root() / "bin" / "mgmt-cmd").string();
     struct Case {
         std::vector<std::string> args;

@@ -91,14 +91,12 @@ TEST(Shutdown, RefusalsInOrder) {
 
     // The reason's length is checked before the state is read: 513 characters are refused even
     // when the state cannot be read, 512 reach the state.
-    ASSERT_EQ(
-        host.Sim({"fault", "set", kGetState, "no state", "--detail", "hostd restarting"}).status,
-        0);
+    host.Fault(kGetState, "no state", 0, "hostd restarting");
     ExpectRefused(host.Cli({"system", "shutdown", "reboot", "-r", std::string(513, 'r')}),
                   "Reason message cannot be longer than 512 characters.");
     ExpectRefused(host.Cli({"system", "shutdown", "reboot", "-r", std::string(512, 'r')}),
                   "no state (hostd restarting)");
-    host.Sim({"fault", "clear"});
+    host.ClearFaults();
     EXPECT_TRUE(mark.Added(kSteps).empty());
 
     // The delay's range is the framework's.
