@@ -162,7 +162,8 @@ TEST(File, RemoveOfActiveFileNeedsForce) {
 
 TEST(File, RemoveOfConfiguredUnreadFileUnconfiguresThenStops) {
     BrixTest::TempHost host;
-    ASSERT_EQ(Coredump(host, {"file", "add", "-s", "64", "-f", "fresh"}).status, 0);
+    ASSERT_EQ(
+        Coredump(host, {"file", "add", "-s", "64", "-d", "ds-local-01", "-f", "fresh"}).status, 0);
     const std::string fresh = "/datastores/ds-local-01/coredump/fresh.dumpfile";
     ASSERT_EQ(Coredump(host, {"file", "set", "-p", fresh}).status, 0);
     ASSERT_EQ(Coredump(host, {"file", "set", "-e", "false"}).status, 0);
