@@ -25,6 +25,22 @@
 #include "identity/TimeSetSystem.h"
 
 // --- coredump ---
+#include "coredump/KernelDumpDornaAdd.h"
+#include "coredump/KernelDumpDornaGet.h"
+#include "coredump/KernelDumpDornaList.h"
+#include "coredump/KernelDumpDornaRemove.h"
+#include "coredump/KernelDumpDornaSet.h"
+#include "coredump/KernelDumpFileAdd.h"
+#include "coredump/KernelDumpFileGet.h"
+#include "coredump/KernelDumpFileList.h"
+#include "coredump/KernelDumpFileRemove.h"
+#include "coredump/KernelDumpFileSet.h"
+#include "coredump/KernelDumpNetworkCheck.h"
+#include "coredump/KernelDumpNetworkGet.h"
+#include "coredump/KernelDumpNetworkSet.h"
+#include "coredump/KernelDumpPartitionGet.h"
+#include "coredump/KernelDumpPartitionList.h"
+#include "coredump/KernelDumpPartitionSet.h"
 
 // --- modules ---
 
@@ -112,21 +128,37 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
             "Operations pertaining to the Brixkernel Core dump configuration on Brixkernel "
             "Diagnostic partitions.");
         // --- coredump partition commands ---
+        partition->RegisterNamespaceNode(KernelDumpPartitionGet::New(), "get");
+        partition->RegisterNamespaceNode(KernelDumpPartitionList::New(), "list");
+        partition->RegisterNamespaceNode(KernelDumpPartitionSet::New(), "set");
         coredump->RegisterNamespaceNode(partition, "partition");
         auto network = MakeNamespace(
             "Operations pertaining to the Brixkernel Core dump configuration on network dump "
             "servers.");
         // --- coredump network commands ---
+        network->RegisterNamespaceNode(KernelDumpNetworkSet::New(), "set");
+        network->RegisterNamespaceNode(KernelDumpNetworkGet::New(), "get");
+        network->RegisterNamespaceNode(KernelDumpNetworkCheck::New(), "check");
         coredump->RegisterNamespaceNode(network, "network");
         auto file = MakeNamespace(
             "Operations pertaining to the Brixkernel Core dump configuration on DSFS Files.");
         // --- coredump file commands ---
+        file->RegisterNamespaceNode(KernelDumpFileGet::New(), "get");
+        file->RegisterNamespaceNode(KernelDumpFileSet::New(), "set");
+        file->RegisterNamespaceNode(KernelDumpFileAdd::New(), "add");
+        file->RegisterNamespaceNode(KernelDumpFileRemove::New(), "remove");
+        file->RegisterNamespaceNode(KernelDumpFileList::New(), "list");
         coredump->RegisterNamespaceNode(file, "file");
         if (*FeatureList[kDornaFeature] != 0) {
             auto dorna = MakeNamespace(
                 "Operations pertaining to the Brixkernel Core dump configuration on DORNA "
                 "Objects.");
             // --- coredump dorna commands ---
+            dorna->RegisterNamespaceNode(KernelDumpDornaGet::New(), "get");
+            dorna->RegisterNamespaceNode(KernelDumpDornaSet::New(), "set");
+            dorna->RegisterNamespaceNode(KernelDumpDornaAdd::New(), "add");
+            dorna->RegisterNamespaceNode(KernelDumpDornaRemove::New(), "remove");
+            dorna->RegisterNamespaceNode(KernelDumpDornaList::New(), "list");
             coredump->RegisterNamespaceNode(dorna, "dorna");
         }
         system->RegisterNamespaceNode(coredump, "coredump");
