@@ -45,7 +45,7 @@ class KernelOpts {
     void SetOption(const std::string& name, const std::string& value);
 
   private:
-    const OptionInfo& Find(const std::string& name);
+    OptionInfo& Find(const std::string& name);
     void Load();
 
     bool loaded_ = false;
