@@ -24,7 +24,7 @@ std::vector<std::string> With(std::vector<std::string> base, std::vector<std::st
 }
 
 class AdvancedOptions : public testing::Test {
-protected:
+  protected:
     BrixTest::TempHost host;
 };
 
@@ -77,9 +77,9 @@ TEST_F(AdvancedOptions, DeltaListsOnlyChangedReadableOptions) {
     ASSERT_EQ(run.status, 0) << run.err;
     EXPECT_EQ(Column(run.out, "Path"),
               (std::vector<std::string>{"/Disk/SchedNumReqOutstanding", "/Mem/MemZipMaxPct",
-                                        "/Misc/HostName", "/Net/Tcp/DelayedAck",
-                                        "/Power/CpuPolicy", "/Scsi/LogCmdErrors",
-                                        "/Syslog/LogHost", "/UserVars/SuppressShellWarning"}));
+                                        "/Misc/HostName", "/Net/Tcp/DelayedAck", "/Power/CpuPolicy",
+                                        "/Scsi/LogCmdErrors", "/Syslog/LogHost",
+                                        "/UserVars/SuppressShellWarning"}));
 
     ASSERT_EQ(Json(host, With(kSet, {"-o", "/Misc/HostName", "-d"})).status, 0);
     ASSERT_EQ(Json(host, With(kSet, {"-o", "/Cpu/SchedQuantumUs", "-i", "60000"})).status, 0);
@@ -143,7 +143,7 @@ struct SetCase {
 };
 
 class AdvancedSetRefusals : public testing::TestWithParam<SetCase> {
-protected:
+  protected:
     BrixTest::TempHost host;
 };
 
@@ -159,31 +159,45 @@ TEST_P(AdvancedSetRefusals, ReportsAndChangesNothing) {
 }
 
 const SetCase kRefusals[] = {
-    {"NoValue", {"-o", "/Cpu/SchedQuantumUs"},
+    {"NoValue",
+     {"-o", "/Cpu/SchedQuantumUs"},
      "must specify exactly one of: int-value, string-value, default"},
-    {"DefaultAndInt", {"-o", "/Cpu/SchedQuantumUs", "-d", "-i", "1000"},
+    {"DefaultAndInt",
+     {"-o", "/Cpu/SchedQuantumUs", "-d", "-i", "1000"},
      "must specify exactly one of: int-value, string-value, default"},
-    {"IntAndString", {"-o", "/Cpu/SchedQuantumUs", "-i", "1000", "-s", "x"},
+    {"IntAndString",
+     {"-o", "/Cpu/SchedQuantumUs", "-i", "1000", "-s", "x"},
      "must specify exactly one of: int-value, string-value, default"},
-    {"AllThree", {"-o", "/Nope", "-i", "1", "-s", "x", "-d"},
+    {"AllThree",
+     {"-o", "/Nope", "-i", "1", "-s", "x", "-d"},
      "must specify exactly one of: int-value, string-value, default"},
-    {"UnknownOption", {"-o", "/Cpu/Nope", "-i", "1"}, "Unable to find option /Cpu/Nope (Not found)"},
-    {"StringForInteger", {"-o", "/Cpu/SchedQuantumUs", "-s", "1000"},
+    {"UnknownOption",
+     {"-o", "/Cpu/Nope", "-i", "1"},
+     "Unable to find option /Cpu/Nope (Not found)"},
+    {"StringForInteger",
+     {"-o", "/Cpu/SchedQuantumUs", "-s", "1000"},
      "option is of type int, but input does not have int value"},
-    {"IntegerForString", {"-o", "/Misc/HostName", "-i", "1"},
+    {"IntegerForString",
+     {"-o", "/Misc/HostName", "-i", "1"},
      "option is type of string, but input does not have string value"},
-    {"NoIntegerView", {"-o", "/Misc/LegacyTimerCalibration", "-i", "1"},
+    {"NoIntegerView",
+     {"-o", "/Misc/LegacyTimerCalibration", "-i", "1"},
      "unable to access option '/Misc/LegacyTimerCalibration' as integer option"},
-    {"NoStringView", {"-o", "/Syslog/TemplateFormat", "-s", "x"},
+    {"NoStringView",
+     {"-o", "/Syslog/TemplateFormat", "-s", "x"},
      "unable to access option '/Syslog/TemplateFormat' as string option"},
-    {"BelowRange", {"-o", "/Cpu/SchedQuantumUs", "-i", "999"},
+    {"BelowRange",
+     {"-o", "/Cpu/SchedQuantumUs", "-i", "999"},
      "Invalid value 999 for option /Cpu/SchedQuantumUs (the value must be between 1000 and "
      "200000)"},
-    {"AboveRangeUser", {"-o", "/UserVars/TelemetryOptIn", "-i", "3"},
+    {"AboveRangeUser",
+     {"-o", "/UserVars/TelemetryOptIn", "-i", "3"},
      "Invalid value 3 for option /UserVars/TelemetryOptIn (the value must be between 0 and 2)"},
-    {"BadCharacter", {"-o", "/Misc/HostName", "-s", "my host"},
+    {"BadCharacter",
+     {"-o", "/Misc/HostName", "-s", "my host"},
      "Invalid value 'my host' for option /Misc/HostName (character ' ' is not allowed)"},
-    {"ResetWithoutHandler", {"-o", "/Misc/LegacyTimerCalibration", "-d"},
+    {"ResetWithoutHandler",
+     {"-o", "/Misc/LegacyTimerCalibration", "-d"},
      "Unable to reset option /Misc/LegacyTimerCalibration (the option's value handler is not "
      "available)"},
 };

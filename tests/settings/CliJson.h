@@ -1,10 +1,9 @@
 // Running commands with the JSON formatter and reading the journal's platform calls.
 #pragma once
 
+#include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
-
-#include <nlohmann/json.hpp>
 
 #include "support/TestHost.h"
 

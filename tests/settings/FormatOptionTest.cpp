@@ -1,6 +1,4 @@
 // FormatOption and FormatBranch on hand-made option trees: the row shapes and the walk.
-#include "settings/FormatOption.h"
-
 #include <gtest/gtest.h>
 
 #include <memory>
@@ -11,6 +9,7 @@
 
 #include "hostctl/Adv.h"
 #include "hostctl/HostCtlException.h"
+#include "settings/FormatOption.h"
 
 namespace {
 
@@ -21,7 +20,7 @@ using OstrelCli::System::FormatOption;
 
 // An option with nothing but its base operations (its typed view cannot be obtained).
 class BareOption : public virtual HostCtl::Adv::AdvancedOption {
-public:
+  public:
     BareOption(std::string path, int type) : path_(std::move(path)), type_(type) {}
     std::string GetPath() override { return path_; }
     int GetType() override { return type_; }
@@ -32,13 +31,13 @@ public:
     void ResetToDefault() override {}
     bool failDescription = false;
 
-private:
+  private:
     std::string path_;
     int type_;
 };
 
 class IntOption : public HostCtl::Adv::AdvancedIntegerOption, public BareOption {
-public:
+  public:
     IntOption(std::string path, uint32_t value, uint32_t def, uint32_t min, uint32_t max)
         : BareOption(std::move(path), 0), value_(value), def_(def), min_(min), max_(max) {}
     uint32_t GetDefault() override { return def_; }
@@ -47,12 +46,12 @@ public:
     uint32_t GetValue() override { return value_; }
     void SetValue(uint32_t value) override { value_ = value; }
 
-private:
+  private:
     uint32_t value_, def_, min_, max_;
 };
 
 class StringOption : public HostCtl::Adv::AdvancedStringOption, public BareOption {
-public:
+  public:
     StringOption(std::string path, std::string value, std::string def, std::string valid)
         : BareOption(std::move(path), 1),
           value_(std::move(value)),
@@ -63,7 +62,7 @@ public:
     std::string GetValue() override { return value_; }
     void SetValue(const std::string& value) override { value_ = value; }
 
-private:
+  private:
     std::string value_, def_, valid_;
 };
 
@@ -85,10 +84,16 @@ std::vector<std::string> FieldNames(const MetaObj::MetaStruct& row) {
     return names;
 }
 
-const std::vector<std::string> kAllFields = {
-    "Path",          "Type",         "Int Value",           "Default Int Value",
-    "Min Value",     "Max Value",    "String Value",        "Default String Value",
-    "Valid Characters", "Description"};
+const std::vector<std::string> kAllFields = {"Path",
+                                             "Type",
+                                             "Int Value",
+                                             "Default Int Value",
+                                             "Min Value",
+                                             "Max Value",
+                                             "String Value",
+                                             "Default String Value",
+                                             "Valid Characters",
+                                             "Description"};
 
 struct RowCase {
     const char* name;
@@ -126,30 +131,62 @@ std::shared_ptr<HostCtl::Adv::AdvancedOption> Bare(const char* path, int type) {
 }
 
 const RowCase kRows[] = {
-    {"IntegerAtDefault", Int("/A/I", 5, 5, 0, 9), false, true,
+    {"IntegerAtDefault",
+     Int("/A/I", 5, 5, 0, 9),
+     false,
+     true,
      {"/A/I", "integer", "5", "5", "0", "9", "", "", "", "about /A/I"}},
-    {"IntegerAtDefaultWithDelta", Int("/A/I", 5, 5, 0, 9), true, false,
+    {"IntegerAtDefaultWithDelta",
+     Int("/A/I", 5, 5, 0, 9),
+     true,
+     false,
      {"/A/I", "integer", "5", "5", "0", "9", "", "", "", "about /A/I"}},
-    {"IntegerChangedWithDelta", Int("/A/I", 7, 5, 0, 9), true, true,
+    {"IntegerChangedWithDelta",
+     Int("/A/I", 7, 5, 0, 9),
+     true,
+     true,
      {"/A/I", "integer", "7", "5", "0", "9", "", "", "", "about /A/I"}},
-    {"IntegerWidensWithoutSign", Int("/A/Max", 4294967295U, 4294967295U, 0, 4294967295U), false,
+    {"IntegerWidensWithoutSign",
+     Int("/A/Max", 4294967295U, 4294967295U, 0, 4294967295U),
+     false,
      true,
      {"/A/Max", "integer", "4294967295", "4294967295", "0", "4294967295", "", "", "",
       "about /A/Max"}},
-    {"StringAtDefaultWithDelta", Str("/A/S", "abc", "abc", "abc"), true, false,
+    {"StringAtDefaultWithDelta",
+     Str("/A/S", "abc", "abc", "abc"),
+     true,
+     false,
      {"/A/S", "string", "null", "null", "null", "null", "abc", "abc", "abc", "about /A/S"}},
-    {"StringCaseCountsWithDelta", Str("/A/S", "ABC", "abc", ""), true, true,
+    {"StringCaseCountsWithDelta",
+     Str("/A/S", "ABC", "abc", ""),
+     true,
+     true,
      {"/A/S", "string", "null", "null", "null", "null", "ABC", "abc", "", "about /A/S"}},
-    {"StringPrefixDiffersWithDelta", Str("/A/S", "ab", "abc", ""), true, true,
+    {"StringPrefixDiffersWithDelta",
+     Str("/A/S", "ab", "abc", ""),
+     true,
+     true,
      {"/A/S", "string", "null", "null", "null", "null", "ab", "abc", "", "about /A/S"}},
-    {"IntegerWithoutView", Bare("/A/X", 0), false, true,
+    {"IntegerWithoutView",
+     Bare("/A/X", 0),
+     false,
+     true,
      {"/A/X", "integer", "-1", "-1", "-1", "-1", "ERROR getting value", "", "", "about /A/X"}},
-    {"IntegerWithoutViewWithDelta", Bare("/A/X", 0), true, false,
+    {"IntegerWithoutViewWithDelta",
+     Bare("/A/X", 0),
+     true,
+     false,
      {"/A/X", "integer", "-1", "-1", "-1", "-1", "ERROR getting value", "", "", "about /A/X"}},
-    {"StringWithoutView", Bare("/A/Y", 1), false, true,
+    {"StringWithoutView",
+     Bare("/A/Y", 1),
+     false,
+     true,
      {"/A/Y", "string", "null", "null", "null", "null", "ERROR getting values", "", "",
       "about /A/Y"}},
-    {"StringWithoutViewWithDelta", Bare("/A/Y", 1), true, false,
+    {"StringWithoutViewWithDelta",
+     Bare("/A/Y", 1),
+     true,
+     false,
      {"/A/Y", "string", "null", "null", "null", "null", "ERROR getting values", "", "",
       "about /A/Y"}},
     // A string-typed option that only has an integer view cannot be read as a string.
@@ -158,7 +195,8 @@ const RowCase kRows[] = {
          auto option = std::make_shared<IntOption>("/A/Z", 1, 1, 0, 1);
          return std::shared_ptr<HostCtl::Adv::AdvancedOption>(option);
      }(),
-     false, true,
+     false,
+     true,
      {"/A/Z", "integer", "1", "1", "0", "1", "", "", "", "about /A/Z"}},
 };
 
@@ -188,7 +226,7 @@ TEST(FormatOption, PlatformFailurePassesOut) {
 
 // A branch built in memory; options are made afresh on each call, as the platform does.
 class Branch : public HostCtl::Adv::AdvancedOptionBranch {
-public:
+  public:
     struct Spec {
         std::string name;
         std::vector<std::string> options;  // a leading '!' makes the option fail to read
@@ -215,14 +253,15 @@ public:
     std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>> GetBranches() override {
         if (spec_.failBranches) throw HostCtlException("branches unavailable");
         std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>> branches;
-        for (const auto& child : spec_.branches) branches.push_back(std::make_unique<Branch>(child));
+        for (const auto& child : spec_.branches)
+            branches.push_back(std::make_unique<Branch>(child));
         return branches;
     }
     std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch> GetBranch(const std::string&) override {
         return nullptr;
     }
 
-private:
+  private:
     Spec spec_;
 };
 
@@ -265,13 +304,17 @@ const WalkCase kWalks[] = {
      {"a", "b", "c", "d", "e"}},
     {"UnreadableOptionSkipped", Spec{"", {"a", "!b", "c"}, {}}, false, {"a", "c"}},
     {"FailingBranchSkippedWalkGoesOn",
-     Spec{"", {"a"}, {Spec{"X", {}, {}, true}, Spec{"Z", {"e"}, {}}}}, false, {"a", "e"}},
+     Spec{"", {"a"}, {Spec{"X", {}, {}, true}, Spec{"Z", {"e"}, {}}}},
+     false,
+     {"a", "e"}},
     {"RowsBeforeBranchFailureStay",
      Spec{"", {}, {Spec{"X", {"c"}, {Spec{"Y", {"d"}, {}}}, false, true}, Spec{"Z", {"e"}, {}}}},
      false,
      {"c", "e"}},
     {"DeltaKeepsChangedOnly",
-     Spec{"", {"a", "changed"}, {Spec{"X", {"changed", "c"}, {}}}}, true, {"changed", "changed"}},
+     Spec{"", {"a", "changed"}, {Spec{"X", {"changed", "c"}, {}}}},
+     true,
+     {"changed", "changed"}},
 };
 
 INSTANTIATE_TEST_SUITE_P(Trees, FormatBranchWalk, testing::ValuesIn(kWalks),

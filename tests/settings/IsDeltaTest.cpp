@@ -1,7 +1,7 @@
 // IsDelta: the type-aware comparison of a kernel setting with its default.
-#include "settings/IsDelta.h"
-
 #include <gtest/gtest.h>
+
+#include "settings/IsDelta.h"
 
 namespace {
 

@@ -25,7 +25,7 @@ std::vector<std::string> With(std::vector<std::string> base, std::vector<std::st
 }
 
 class KernelSettings : public testing::Test {
-protected:
+  protected:
     BrixTest::TempHost host;
 };
 
@@ -42,7 +42,8 @@ TEST_F(KernelSettings, ListsEverySettingOrderedWithoutRegardToCase) {
     }));
     std::set<std::string> types;
     for (const auto& row : run.out) types.insert(row["Type"].get<std::string>());
-    EXPECT_EQ(types, (std::set<std::string>{"bool", "int32", "string", "uint32", "uint64", "uint8"}));
+    EXPECT_EQ(types,
+              (std::set<std::string>{"bool", "int32", "string", "uint32", "uint64", "uint8"}));
 }
 
 TEST_F(KernelSettings, DeltaUsesTheTypeAwareComparison) {
@@ -52,8 +53,8 @@ TEST_F(KernelSettings, DeltaUsesTheTypeAwareComparison) {
     // irqRebalanceShift (uint8 1 against 257) and serialBaudRate (115200 against 0x1c200).
     EXPECT_EQ(Column(run.out, "Name"),
               (std::vector<std::string>{"clockDriftPpm", "crashKernelBytes", "deviceNamePolicy",
-                                        "intrBalancingPeriodMs", "iommuDisableIr",
-                                        "kernelLogPort", "memTierCount"}));
+                                        "intrBalancingPeriodMs", "iommuDisableIr", "kernelLogPort",
+                                        "memTierCount"}));
 }
 
 TEST_F(KernelSettings, OptionMatchesWithoutRegardToCase) {
@@ -90,10 +91,10 @@ TEST_F(KernelSettings, SetChangesTheConfiguredValueOnly) {
     EXPECT_EQ(largeBar["Configured"], "FALSE");
     EXPECT_EQ(largeBar["Runtime"], "TRUE");
 
-    EXPECT_EQ(Calls(host, "KernCtl::System::KernelOpts::"),
-              (std::vector<json>{{"KernCtl::System::KernelOpts::SetOption", "maxPcpus", "0x80"},
-                                 {"KernCtl::System::KernelOpts::SetOption", "enableLargeBar",
-                                  "FALSE"}}));
+    EXPECT_EQ(
+        Calls(host, "KernCtl::System::KernelOpts::"),
+        (std::vector<json>{{"KernCtl::System::KernelOpts::SetOption", "maxPcpus", "0x80"},
+                           {"KernCtl::System::KernelOpts::SetOption", "enableLargeBar", "FALSE"}}));
 }
 
 struct Refusal {
@@ -103,7 +104,7 @@ struct Refusal {
 };
 
 class KernelSettingRefusals : public testing::TestWithParam<Refusal> {
-protected:
+  protected:
     BrixTest::TempHost host;
 };
 
@@ -120,19 +121,25 @@ TEST_P(KernelSettingRefusals, ReportAndKeepTheValue) {
 
 const Refusal kRefusals[] = {
     {"UnknownSetting", {"-s", "warpDrive", "-v", "1"}, "Unknown kernel setting 'warpDrive'"},
-    {"BoolWord", {"-s", "skipPciReset", "-v", "yes"},
+    {"BoolWord",
+     {"-s", "skipPciReset", "-v", "yes"},
      "Invalid value 'yes' for kernel setting 'skipPciReset': expected TRUE or FALSE"},
-    {"Uint8TooLarge", {"-s", "tscCalibrationRounds", "-v", "256"},
+    {"Uint8TooLarge",
+     {"-s", "tscCalibrationRounds", "-v", "256"},
      "Invalid value '256' for kernel setting 'tscCalibrationRounds': expected a number from 0 "
      "to 255"},
-    {"Uint32NotANumber", {"-s", "maxPcpus", "-v", "12x"},
+    {"Uint32NotANumber",
+     {"-s", "maxPcpus", "-v", "12x"},
      "Invalid value '12x' for kernel setting 'maxPcpus': expected a number from 0 to 4294967295"},
-    {"Uint32Negative", {"-s", "maxPcpus", "-v", "-1"},
+    {"Uint32Negative",
+     {"-s", "maxPcpus", "-v", "-1"},
      "Invalid value '-1' for kernel setting 'maxPcpus': expected a number from 0 to 4294967295"},
-    {"Int32TooSmall", {"-s", "timerSkewNs", "-v", "-2147483649"},
+    {"Int32TooSmall",
+     {"-s", "timerSkewNs", "-v", "-2147483649"},
      "Invalid value '-2147483649' for kernel setting 'timerSkewNs': expected a number from "
      "-2147483648 to 2147483647"},
-    {"Uint64TooLarge", {"-s", "maxIoSizeBytes", "-v", "18446744073709551616"},
+    {"Uint64TooLarge",
+     {"-s", "maxIoSizeBytes", "-v", "18446744073709551616"},
      "Invalid value '18446744073709551616' for kernel setting 'maxIoSizeBytes': expected a "
      "number from 0 to 18446744073709551615"},
 };

@@ -24,7 +24,7 @@ std::vector<std::string> With(std::vector<std::string> base, std::vector<std::st
 }
 
 class KeyboardLayout : public testing::Test {
-protected:
+  protected:
     BrixTest::TempHost host;
     const std::string prefix = "KernCtl::System::SystemInfoImpl::";
 };
@@ -49,13 +49,15 @@ TEST_F(KeyboardLayout, NoPersistLoadsWithoutStoring) {
 
 TEST_F(KeyboardLayout, PersistentChangeIsStoredBeforeItIsLoaded) {
     ASSERT_EQ(Json(host, With(kSet, {"--layout", "French"})).status, 0);
-    EXPECT_EQ(Calls(host, prefix), (std::vector<json>{{prefix + "SetKeyboardLayout", "French"},
-                                                      {prefix + "LoadKeyboardMappings", "French"}}));
+    EXPECT_EQ(Calls(host, prefix),
+              (std::vector<json>{{prefix + "SetKeyboardLayout", "French"},
+                                 {prefix + "LoadKeyboardMappings", "French"}}));
     EXPECT_EQ(Json(host, kGet).out, "French");
 }
 
 TEST_F(KeyboardLayout, WithoutLayoutOnlyReloads) {
-    for (const auto& extra : {std::vector<std::string>{}, std::vector<std::string>{"--no-persist"}}) {
+    for (const auto& extra :
+         {std::vector<std::string>{}, std::vector<std::string>{"--no-persist"}}) {
         ASSERT_EQ(Json(host, With(kSet, extra)).status, 0);
     }
     EXPECT_EQ(Calls(host, prefix), (std::vector<json>{{prefix + "LoadKeyboardMappings", ""},
