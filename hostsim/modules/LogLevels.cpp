@@ -37,8 +37,7 @@ std::vector<HostCtl::System::LogLevel> ReadLevels(Store& store, const std::strin
     std::vector<HostCtl::System::LogLevel> levels;
     while (row.Step()) {
         const auto defaultLevel = static_cast<int32_t>(row.Int(1));
-        const bool current =
-            BrixSim::Kernel::SameBoot(store, BrixSim::Kernel::BootColumn(row, 3), boot);
+        const bool current = row.Int(3) == boot;
         levels.emplace_back(row.Text(0), current ? static_cast<int32_t>(row.Int(2)) : defaultLevel,
                             defaultLevel);
     }

@@ -617,7 +617,7 @@ void Seed(BrixSim::Store& store) {
 
         auto level = store.Prepare(
             "INSERT INTO log_levels (owner, seq, name, default_level, current_level, boot)"
-            " VALUES (?, ?, ?, ?, ?, NULL)");
+            " VALUES (?, ?, ?, ?, ?, 0)");
         seq = 0;
         for (const auto& l : kLevels) {
             level.Bind(1, l.owner).Bind(2, ++seq).Bind(3, l.name).Bind(4, l.defaultLevel);
@@ -651,10 +651,10 @@ const bool registered = BrixSim::RegisterTables({
     "CREATE TABLE IF NOT EXISTS module_options ("
     " name TEXT PRIMARY KEY, options TEXT NOT NULL);"
     // Log levels of the core (owner '') and of modules. The current level holds for the boot
-    // it was set in (null: the boot the host was created in); otherwise the default holds.
+    // it was set in; in a later boot the default holds.
     "CREATE TABLE IF NOT EXISTS log_levels ("
     " owner TEXT NOT NULL, seq INTEGER NOT NULL, name TEXT NOT NULL,"
-    " default_level INTEGER NOT NULL, current_level INTEGER NOT NULL, boot INTEGER,"
+    " default_level INTEGER NOT NULL, current_level INTEGER NOT NULL, boot INTEGER NOT NULL,"
     " PRIMARY KEY (owner, name));",
     Seed,
 });

@@ -4,23 +4,15 @@
 #pragma once
 
 #include <cstdint>
-#include <optional>
 
 namespace BrixSim {
 class Store;
-class Stmt;
-}  // namespace BrixSim
+}
 
 namespace BrixSim::Kernel {
 
-// The running boot's identifier.
+// The running boot: 0 for the boot the host was created in, one more after every restart
+// (a reboot, or a power-off and the power-on that follows).
 int64_t CurrentBoot(Store& store);
-
-// Whether state recorded during `boot` still holds in the boot `current`. A null boot is state
-// the host was created with, which holds until the first restart.
-bool SameBoot(Store& store, const std::optional<int64_t>& boot, int64_t current);
-
-// The boot column at `column` of the current row.
-std::optional<int64_t> BootColumn(const Stmt& row, int column);
 
 }  // namespace BrixSim::Kernel

@@ -113,17 +113,17 @@ const bool registered = [] {
     });
     return BrixSim::RegisterTables({
         "kernelopts",
-        // runtime_boot: the boot whose running kernel uses `runtime` (null: the boot the host
-        // was created in); in any later boot the running kernel uses `configured`.
+        // runtime_boot: the boot whose running kernel uses `runtime`; in any later boot the
+        // running kernel uses `configured`.
         "CREATE TABLE IF NOT EXISTS kernel_settings ("
         " name TEXT PRIMARY KEY COLLATE NOCASE, seq INTEGER NOT NULL, type INTEGER NOT NULL,"
         " description TEXT NOT NULL, configured TEXT NOT NULL, runtime TEXT NOT NULL,"
-        " default_value TEXT NOT NULL, runtime_boot INTEGER);",
+        " default_value TEXT NOT NULL, runtime_boot INTEGER NOT NULL);",
         [](Store& store) {
             store.Write([&] {
                 auto insert = store.Prepare(
                     "INSERT INTO kernel_settings (name, seq, type, description, configured,"
-                    " runtime, default_value, runtime_boot) VALUES (?, ?, ?, ?, ?, ?, ?, NULL)");
+                    " runtime, default_value, runtime_boot) VALUES (?, ?, ?, ?, ?, ?, ?, 0)");
                 int64_t seq = 0;
                 for (const auto& s : kSettings) {
                     insert.Bind(1, s.name).Bind(2, ++seq).Bind(3, static_cast<int>(s.type));
@@ -217,9 +217,7 @@ void KernelOpts::Load() {
         info.type = static_cast<Type>(row.Int(1));
         info.description = row.Text(2);
         info.configured = row.Text(3);
-        info.runtime = BrixSim::Kernel::SameBoot(store, BrixSim::Kernel::BootColumn(row, 6), boot)
-                           ? row.Text(4)
-                           : info.configured;
+        info.runtime = row.Int(6) == boot ? row.Text(4) : info.configured;
         info.defaultValue = row.Text(5);
         options_.emplace(info.name, std::move(info));
     }

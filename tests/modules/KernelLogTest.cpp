@@ -2,6 +2,7 @@
 // in-process.
 #include <gtest/gtest.h>
 
+#include <csignal>
 #include <functional>
 #include <string>
 #include <utility>
@@ -12,6 +13,7 @@
 #include "cmdkit/AutoCli.h"
 #include "modules/KernelLogList.h"
 #include "modules/KernelLogSetLevel.h"
+#include "os/HostOs.h"
 
 namespace {
 
@@ -118,6 +120,19 @@ TEST_F(KernelLog, SetAndReset) {
                            json::array({mod + "SetLogLevel", "qln_nic10g", "qln_nic10gDbg", 5}),
                            json::array({sys + "SetDefaultLogLevel", "ScsiPath"}),
                            json::array({mod + "SetDefaultLogLevel", "hvs_sas", "hvs_sas"})}));
+}
+
+TEST_F(KernelLog, LevelsDoNotSurviveARestart) {
+    EXPECT_TRUE(Set({{"level-name", "Net"}, {"level", "3"}}).empty());
+    EXPECT_TRUE(Set({{"level-name", "dsfs"}, {"module", "dsfs3"}, {"level", "4"}}).empty());
+    EXPECT_EQ(List({{"level-name", "Net"}}), json::parse(R"([["Net", 3, 0]])"));
+    ASSERT_EQ(HostOs::kill(1, SIGUSR2), 0);  // powered off, and on again
+    EXPECT_EQ(List({{"level-name", "Net"}}), json::parse(R"([["Net", 0, 0]])"));
+    EXPECT_EQ(List({{"level-name", "ScsiPath"}}), json::parse(R"([["ScsiPath", 1, 1]])"));
+    EXPECT_EQ(List({{"module", "dsfs3"}, {"level-name", "dsfs"}}),
+              json::parse(R"([["dsfs", 0, 0]])"));
+    EXPECT_TRUE(Set({{"level-name", "Net"}, {"level", "2"}}).empty());
+    EXPECT_EQ(List({{"level-name", "Net"}}), json::parse(R"([["Net", 2, 0]])"));
 }
 
 TEST_F(KernelLog, SetRefusals) {

@@ -3,11 +3,13 @@
 
 #include <algorithm>
 #include <cctype>
+#include <csignal>
 #include <set>
 #include <string>
 #include <vector>
 
 #include "CliJson.h"
+#include "os/HostOs.h"
 
 namespace {
 
@@ -161,6 +163,23 @@ TEST_F(KernelSettings, BoundaryValuesAreAccepted) {
         EXPECT_EQ(run.status, 0) << setting << "=" << value << ": " << run.err;
         EXPECT_EQ(Json(host, With(kList, {"-o", setting})).out[0]["Configured"], value);
     }
+}
+
+TEST_F(KernelSettings, RestartRunsTheConfiguredValues) {
+    ASSERT_EQ(Json(host, With(kSet, {"-s", "maxPcpus", "-v", "128"})).status, 0);
+    ASSERT_EQ(HostOs::kill(1, SIGTERM), 0);  // the host's init restarts it
+    for (const auto& [setting, runtime] :
+         std::vector<std::pair<std::string, std::string>>{{"maxPcpus", "128"},
+                                                          {"crashKernelBytes", "536870912"},
+                                                          {"deviceNamePolicy", "naa"},
+                                                          {"debugHeapPoison", "false"}}) {
+        const auto row = Json(host, With(kList, {"-o", setting})).out[0];
+        EXPECT_EQ(row["Runtime"], runtime) << setting;
+        EXPECT_EQ(row["Configured"], runtime) << setting;
+    }
+    // A change made in this boot again waits for the next one.
+    ASSERT_EQ(Json(host, With(kSet, {"-s", "maxPcpus", "-v", "64"})).status, 0);
+    EXPECT_EQ(Json(host, With(kList, {"-o", "maxPcpus"})).out[0]["Runtime"], "128");
 }
 
 TEST_F(KernelSettings, PlatformFaults) {
