@@ -93,10 +93,9 @@ TEST(Registration, SystemHelpListsEveryNamespaceWithDescription) {
     BrixTest::TempHost host;
     auto help = host.Cli({"system", "--help"});
     ASSERT_EQ(help.status, 0) << help.err;
-    for (const char* text :
-         {"maintenanceMode", "Command to manage the system's maintenance mode.", "quillfs",
-          "Operations pertaining to the quillfs memory filesytem.", "welcomemsg",
-          "Commands to get and set the welcome banner for KCON."}) {
+    for (const char* text : {"maintenanceMode", "Command to manage the system's maintenance mode.",
+                             "quillfs", "Operations pertaining to the quillfs memory filesytem.",
+                             "welcomemsg", "Commands to get and set the welcome banner for KCON."}) {
         EXPECT_NE(help.out.find(text), std::string::npos) << text;
     }
 }

@@ -23,8 +23,7 @@ TEST(SystemInfo, JsonOutputOfEveryQuery) {
                          "Update":"2","Patch":"41"})")},
         {{"system", "stats", "installtime", "get"}, "2025-03-14T09:26:53.589793+00:00"},
         {{"system", "boot", "device", "get"},
-         json::parse(
-             R"({"Boot NIC":"","Boot Filesystem UUID":"c41f9e02-7d3a-4e6b-a8c5-2f90b17d64e8",
+         json::parse(R"({"Boot NIC":"","Boot Filesystem UUID":"c41f9e02-7d3a-4e6b-a8c5-2f90b17d64e8",
                          "Stateless Boot NIC":""})")},
         {{"system", "welcomemsg", "get"}, "Welcome to Brix Host"},
     };
@@ -73,21 +72,16 @@ struct FaultCase {
 TEST(SystemInfo, FaultsBecomeMessagesWithPrefixes) {
     const FaultCase cases[] = {
         {"KernCtl::System::SystemInfoImpl::GetSystemUuid", {"system", "uuid", "get"}, "boom"},
-        {"KernCtl::Util::Sysinfo::Get",
-         {"system", "version", "get"},
+        {"KernCtl::Util::Sysinfo::Get", {"system", "version", "get"},
          "Unable to query product version: boom"},
-        {"HostCtl::System::SystemInfo::GetInceptionTime",
-         {"system", "stats", "installtime", "get"},
+        {"HostCtl::System::SystemInfo::GetInceptionTime", {"system", "stats", "installtime", "get"},
          "system inception timestamp missing: boom"},
-        {"KernCtl::System::SystemInfoImpl::GetBootFsUUID",
-         {"system", "boot", "device", "get"},
+        {"KernCtl::System::SystemInfoImpl::GetBootFsUUID", {"system", "boot", "device", "get"},
          "boom"},
-        {"KernCtl::System::SystemInfoImpl::GetWelcomeMessage",
-         {"system", "welcomemsg", "get"},
+        {"KernCtl::System::SystemInfoImpl::GetWelcomeMessage", {"system", "welcomemsg", "get"},
          "boom"},
         {"KernCtl::System::SystemInfoImpl::SetWelcomeMessage",
-         {"system", "welcomemsg", "set", "-m", "x"},
-         "boom"},
+         {"system", "welcomemsg", "set", "-m", "x"}, "boom"},
     };
     for (const auto& c : cases) {
         BrixTest::TempHost host;
@@ -153,9 +147,9 @@ TEST(SystemInfo, ListCommandsShowsTheQueries) {
     const auto listing = json::parse(run.out);
     std::vector<std::string> paths;
     for (const auto& row : listing) paths.push_back(row.begin()->get<std::string>());
-    for (const char* path :
-         {"system uuid get", "system version get", "system stats installtime get",
-          "system boot device get", "system welcomemsg get", "system welcomemsg set"}) {
+    for (const char* path : {"system uuid get", "system version get", "system stats installtime get",
+                             "system boot device get", "system welcomemsg get",
+                             "system welcomemsg set"}) {
         EXPECT_NE(std::find(paths.begin(), paths.end(), path), paths.end()) << path;
     }
 }
