@@ -276,10 +276,32 @@ TEST_F(AdvancedOptions, PlatformFaults) {
     for (const auto& row : run.out) EXPECT_EQ(row["Type"], "integer");
 
     host.Sim({"fault", "clear"});
+    host.Fault("HostCtl::Misc::StringTokenize", "tokenizer unavailable");
+    run = Json(host, With(kList, {"-t", "Misc"}));
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.err, "tokenizer unavailable\n");
+    EXPECT_TRUE(run.out.is_null());
+
+    host.Sim({"fault", "clear"});
     host.Fault("KernCtl::Adv::AdvancedOptionImpl::ApplyChange", "commit refused");
     run = Json(host, With(kSet, {"-o", "/Cpu/SchedQuantumUs", "-i", "2000"}));
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(run.err, "commit refused\n");
+}
+
+TEST_F(AdvancedOptions, OperationsCanBeMadeToFail) {
+    const auto ops = host.Sim({"fault", "ops"}).out;
+    for (const char* op :
+         {"HostCtl::Misc::StringTokenize", "KernCtl::Adv::AdvancedOptionImpl::FindOption",
+          "KernCtl::Adv::AdvancedUserStringOptionImpl::SetValue",
+          "KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch",
+          "KernCtl::System::KernelOpts::SetOption",
+          "KernCtl::System::SystemInfoImpl::LoadKeyboardMappings",
+          "KernCtl::System::ModuleImpl::CopyParameters",
+          "KernCtl::System::SystemInfoImpl::SetDefaultLogLevel",
+          "HostCtl::System::SystemInfo::GetModule"}) {
+        EXPECT_NE(ops.find(std::string(op) + "\n"), std::string::npos) << op;
+    }
 }
 
 }  // namespace
