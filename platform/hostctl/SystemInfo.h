@@ -19,6 +19,8 @@ public:
     std::string GetInceptionTime();
 
     // --- modules ---
+    // The module object for a name; its operations check the name.
+    std::unique_ptr<Module> GetModule(const std::string& name);
 
     // --- agents ---
 };

@@ -43,8 +43,22 @@
 #include "coredump/KernelDumpPartitionSet.h"
 
 // --- modules ---
+#include "modules/ModuleGet.h"
+#include "modules/ModuleList.h"
+#include "modules/ModuleLoad.h"
+#include "modules/ModuleParametersCopy.h"
+#include "modules/ModuleParametersList.h"
+#include "modules/ModuleParametersSet.h"
+#include "modules/ModuleSet.h"
 
 // --- settings ---
+#include "settings/SettingsAdvancedList.h"
+#include "settings/SettingsAdvancedSet.h"
+#include "settings/SettingsKernelList.h"
+#include "settings/SettingsKernelSet.h"
+#include "settings/SettingsKeyboardLayoutGet.h"
+#include "settings/SettingsKeyboardLayoutList.h"
+#include "settings/SettingsKeyboardLayoutSet.h"
 
 // --- process ---
 
@@ -94,16 +108,23 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
         auto kernel = MakeNamespace(
             "Operations that allow viewing and manipulation of system kernel settings.");
         // --- settings kernel commands ---
+        kernel->RegisterNamespaceNode(SettingsKernelList::New(), "list");
+        kernel->RegisterNamespaceNode(SettingsKernelSet::New(), "set");
         settings->RegisterNamespaceNode(kernel, "kernel");
         auto advanced = MakeNamespace(
             "The advanced settings are a set of Brixkernel options that specific configuration "
             "settings to be modified. These options are typically in place for specific "
             "workarounds or debugging.");
         // --- settings advanced commands ---
+        advanced->RegisterNamespaceNode(SettingsAdvancedList::New(), "list");
+        advanced->RegisterNamespaceNode(SettingsAdvancedSet::New(), "set");
         settings->RegisterNamespaceNode(advanced, "advanced");
         auto keyboard = MakeNamespace("Operations that relate to the keyboard");
         auto layout = MakeNamespace("Operations that relate to keyboard layout");
         // --- settings keyboard layout commands ---
+        layout->RegisterNamespaceNode(SettingsKeyboardLayoutGet::New(), "get");
+        layout->RegisterNamespaceNode(SettingsKeyboardLayoutSet::New(), "set");
+        layout->RegisterNamespaceNode(SettingsKeyboardLayoutList::New(), "list");
         keyboard->RegisterNamespaceNode(layout, "layout");
         settings->RegisterNamespaceNode(keyboard, "keyboard");
         system->RegisterNamespaceNode(settings, "settings");
@@ -113,12 +134,19 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
             "Operations that allow manipulation of the Brixkernel loadable modules and device "
             "drivers. Operations include load, list and setting options.");
         // --- module get ---
+        module->RegisterNamespaceNode(ModuleGet::New(), "get");
         auto parameters = MakeNamespace(
             "Operations that allow manipulation of parameters of Brixkernel loadable modules "
             "and device drivers. Operations include list and set options.");
         // --- module parameters commands ---
+        parameters->RegisterNamespaceNode(ModuleParametersList::New(), "list");
+        parameters->RegisterNamespaceNode(ModuleParametersSet::New(), "set");
+        parameters->RegisterNamespaceNode(ModuleParametersCopy::New(), "copy");
         module->RegisterNamespaceNode(parameters, "parameters");
         // --- module list, load, set ---
+        module->RegisterNamespaceNode(ModuleList::New(), "list");
+        module->RegisterNamespaceNode(ModuleLoad::New(), "load");
+        module->RegisterNamespaceNode(ModuleSet::New(), "set");
         system->RegisterNamespaceNode(module, "module");
     }
     {
