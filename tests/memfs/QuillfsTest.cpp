@@ -21,9 +21,11 @@ namespace {
 
 using BrixTest::TempHost;
 using nlohmann::json;
+// Results are parsed keeping their key order.
+using ojson = nlohmann::ordered_json;
 using namespace OstrelCli::System;
 
-std::vector<std::string> Keys(const json& object) {
+std::vector<std::string> Keys(const ojson& object) {
     std::vector<std::string> keys;
     for (const auto& item : object.items()) keys.push_back(item.key());
     return keys;
@@ -58,16 +60,16 @@ json Inodes(int64_t total, int64_t baseUsed, int64_t peakUsed) {
              {"peak_reserved", 0}}};
 }
 
-json List(const TempHost& host, const char* what) {
+ojson List(const TempHost& host, const char* what) {
     const auto run = host.Cli({"--formatter=json", "system", "quillfs", what, "list"});
     EXPECT_EQ(run.status, 0) << run.err;
-    return json::parse(run.out);
+    return ojson::parse(run.out);
 }
 
-json FindDisk(const json& disks, const std::string& name) {
+ojson FindDisk(const ojson& disks, const std::string& name) {
     for (const auto& disk : disks)
         if (disk["Ramdisk Name"] == name) return disk;
-    return json();
+    return ojson();
 }
 
 std::vector<json> Records(const TempHost& host, const std::string& kind) {
@@ -183,7 +185,7 @@ TEST(QuillfsRamdiskAdd, AddListRemoveRoundTrip) {
     auto run = host.Cli({"--formatter=json", "system", "quillfs", "ramdisk", "add", "-m", "32",
                          "-M", "64", "-p", "0755", "-n", "r1", "-t", "/r1"});
     ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(json::parse(run.out), true);
+    EXPECT_EQ(ojson::parse(run.out), true);
     const auto mounts = Records(host, "mount");
     ASSERT_EQ(mounts.size(), 1u);
     EXPECT_EQ(mounts[0]["source"], "");
@@ -194,14 +196,14 @@ TEST(QuillfsRamdiskAdd, AddListRemoveRoundTrip) {
 
     const auto disks = List(host, "ramdisk");
     const auto r1 = FindDisk(disks, "r1");
-    EXPECT_EQ(r1, json::parse(R"({"Ramdisk Name":"r1","System":false,"Include in Coredumps":false,
+    EXPECT_EQ(r1, ojson::parse(R"({"Ramdisk Name":"r1","System":false,"Include in Coredumps":false,
         "Reserved":32768,"Maximum":65536,"Used":0,"Peak Used":0,"Free":100,"Reserved Free":100,
         "Maximum Inodes":8192,"Allocated Inodes":128,"Used Inodes":1,"Mount Point":"/r1"})"));
     EXPECT_EQ(disks.back(), r1);  // newest last
 
     run = host.Cli({"--formatter=json", "system", "quillfs", "ramdisk", "remove", "-t", "/r1"});
     ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(json::parse(run.out), true);
+    EXPECT_EQ(ojson::parse(run.out), true);
     const auto umounts = Records(host, "umount");
     ASSERT_EQ(umounts.size(), 1u);
     EXPECT_EQ(umounts[0]["target"], "/r1");
@@ -435,7 +437,7 @@ TEST(QuillfsTardiskList, ListsNamesSystemFlagAndThirtyTwoBitSizes) {
                   {{{"id", 1}, {"name", "small.tdk"}, {"size", 4294967295}, {"system", 1}},
                    {{"id", 2}, {"name", "huge.tdk"}, {"size", 4294967301}, {"system", 0}}}}});
     disks = List(host, "tardisk");
-    EXPECT_EQ(disks, json::parse(R"([{"Tardisk Name":"small.tdk","System":true,"Size":4294967295},
+    EXPECT_EQ(disks, ojson::parse(R"([{"Tardisk Name":"small.tdk","System":true,"Size":4294967295},
         {"Tardisk Name":"huge.tdk","System":false,"Size":5}])"));
 
     const auto run = host.Cli({"system", "quillfs", "tardisk", "list"});
@@ -462,7 +464,7 @@ TEST(QuillfsGet, ComputesFreePercentagesFromTheCounters) {
                      {"quillfs_ramdisks", json::array()}});
         const auto run = host.Cli({"--formatter=json", "system", "quillfs", "get"});
         ASSERT_EQ(run.status, 0) << run.err;
-        const auto status = json::parse(run.out);
+        const auto status = ojson::parse(run.out);
         EXPECT_EQ(Keys(status),
                   (std::vector<std::string>{"Total Inodes", "Used Inodes", "Unlinked Inodes",
                                             "Reserved Inodes", "Peak Used Inodes",

@@ -18,6 +18,8 @@ namespace {
 
 using BrixTest::TempHost;
 using nlohmann::json;
+// Results are parsed keeping their key order.
+using ojson = nlohmann::ordered_json;
 
 const std::vector<std::string> kWorldFields = {"Id",
                                                "Name",
@@ -32,7 +34,7 @@ const std::vector<std::string> kWorldFields = {"Id",
                                                "World Type",
                                                "Security Domain"};
 
-std::vector<std::string> Keys(const json& object) {
+std::vector<std::string> Keys(const ojson& object) {
     std::vector<std::string> keys;
     for (const auto& item : object.items()) keys.push_back(item.key());
     return keys;
@@ -96,7 +98,7 @@ TEST(ProcessList, JsonHasEveryFieldOfEveryWorldInOrder) {
     const auto run = host.Cli({"--formatter=json", "system", "process", "list"});
     ASSERT_EQ(run.status, 0) << run.err;
     EXPECT_EQ(run.err, "");
-    const auto worlds = json::parse(run.out);
+    const auto worlds = ojson::parse(run.out);
     ASSERT_TRUE(worlds.is_array());
     ASSERT_GE(worlds.size(), 20u);
     int64_t previous = 0;
@@ -112,7 +114,7 @@ TEST(ProcessList, JsonHasEveryFieldOfEveryWorldInOrder) {
         for (const auto& world : worlds)
             if (world["Name"] == name) return world;
         ADD_FAILURE() << name << " not listed";
-        return json();
+        return ojson();
     };
     const auto init = find("init");
     EXPECT_EQ(init["Parent Cartel Id"], 0);
@@ -154,11 +156,11 @@ TEST(ProcessList, ShowsImportedWorldsWithTheirLabelsAndCodes) {
                    World(4294967295, "last", 0, 1, 3)}}});
     const auto run = host.Cli({"--formatter=json", "system", "process", "list"});
     ASSERT_EQ(run.status, 0) << run.err;
-    const auto worlds = json::parse(run.out);
+    const auto worlds = ojson::parse(run.out);
     ASSERT_EQ(worlds.size(), 3u);
     EXPECT_EQ(
         worlds[0],
-        json::parse(R"({"Id":5000,"Name":"alpha","Command Line":"/usr/lib/brix/bin/alpha --fg",
+        ojson::parse(R"({"Id":5000,"Name":"alpha","Command Line":"/usr/lib/brix/bin/alpha --fg",
                 "Cartel Id":4999,"Parent Cartel Id":1000,"World Group Id":5000,
                 "Cartel Group Id":4999,"Session Id":1000,"World Flags":1033,
                 "World State":"Waiting","World Type":"User","Security Domain":"mgmtAgents"})"));
@@ -177,7 +179,7 @@ TEST(ProcessList, EmptyWhenThereAreNoWorlds) {
     host.Import({{"process_worlds", json::array()}});
     const auto run = host.Cli({"--formatter=json", "system", "process", "list"});
     EXPECT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(json::parse(run.out), json::array());
+    EXPECT_EQ(ojson::parse(run.out), ojson::array());
 }
 
 TEST(ProcessList, PlatformFailureEndsTheListingWithItsMessageOnly) {
@@ -268,7 +270,7 @@ TEST(ProcessStatsLoadGet, DividesEachFigureByNTimesAHundred) {
         const auto run =
             host.Cli({"--formatter=json", "system", "process", "stats", "load", "get"});
         ASSERT_EQ(run.status, 0) << run.err;
-        const auto result = json::parse(run.out);
+        const auto result = ojson::parse(run.out);
         EXPECT_EQ(Keys(result),
                   (std::vector<std::string>{"Load 1 Minute", "Load 5 Minutes", "Load 15 Minutes"}));
         EXPECT_EQ(result["Load 1 Minute"], c.t1);
@@ -282,7 +284,8 @@ TEST(ProcessStatsLoadGet, SeededHostShowsPlausibleTwoDecimalLoads) {
     const auto run = host.Cli({"--formatter=json", "system", "process", "stats", "load", "get"});
     ASSERT_EQ(run.status, 0) << run.err;
     const std::regex twoDecimals("[0-9]+\\.[0-9]{2}");
-    for (const auto& [field, text] : json::parse(run.out).items()) {
+    const auto loads = ojson::parse(run.out);
+    for (const auto& [field, text] : loads.items()) {
         EXPECT_TRUE(std::regex_match(text.get<std::string>(), twoDecimals)) << field << text;
         EXPECT_LT(std::stod(text.get<std::string>()), 64.0) << field;
     }
@@ -293,7 +296,7 @@ TEST(ProcessStatsLoadGet, ZeroCountGivesInfinityOrNotANumberNotACrash) {
     host.Import(Stats(3, 0, 150, 75, 0));
     const auto run = host.Cli({"--formatter=json", "system", "process", "stats", "load", "get"});
     ASSERT_EQ(run.status, 0) << run.err;
-    const auto result = json::parse(run.out);
+    const auto result = ojson::parse(run.out);
     EXPECT_EQ(result["Load 1 Minute"], "inf");
     EXPECT_EQ(result["Load 5 Minutes"], "inf");
     const std::regex nan("-?nan");
@@ -305,10 +308,10 @@ TEST(ProcessStatsRunningGet, ReportsTheRunningCount) {
     TempHost host;
     auto run = host.Cli({"--formatter=json", "system", "process", "stats", "running", "get"});
     ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(json::parse(run.out), json({{"Running Processes", 3}}));
+    EXPECT_EQ(ojson::parse(run.out), ojson({{"Running Processes", 3}}));
     host.Import(Stats(2147483647, 1, 0, 0, 0));
     run = host.Cli({"--formatter=json", "system", "process", "stats", "running", "get"});
-    EXPECT_EQ(json::parse(run.out), json({{"Running Processes", 2147483647}}));
+    EXPECT_EQ(ojson::parse(run.out), ojson({{"Running Processes", 2147483647}}));
 }
 
 TEST(ProcessStats, FetchFailureIsReportedWithoutAResult) {
