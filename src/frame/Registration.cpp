@@ -61,8 +61,16 @@
 #include "settings/SettingsKeyboardLayoutSet.h"
 
 // --- process ---
+#include "process/ProcessList.h"
+#include "process/ProcessStatsLoadGet.h"
+#include "process/ProcessStatsRunningGet.h"
 
 // --- memfs ---
+#include "memfs/QuillfsGet.h"
+#include "memfs/QuillfsRamdiskAdd.h"
+#include "memfs/QuillfsRamdiskList.h"
+#include "memfs/QuillfsRamdiskRemove.h"
+#include "memfs/QuillfsTardiskList.h"
 
 // --- agents: snmp ---
 
@@ -206,12 +214,15 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto process = MakeNamespace("Commands relating to running processes.");
         // --- process list ---
+        process->RegisterNamespaceNode(ProcessList::New(), "list");
         auto stats = MakeNamespace("Process related statistics");
         auto load = MakeNamespace("System load averages");
         // --- process stats load get ---
+        load->RegisterNamespaceNode(ProcessStatsLoadGet::New(), "get");
         stats->RegisterNamespaceNode(load, "load");
         auto running = MakeNamespace("Number of currently running worlds");
         // --- process stats running get ---
+        running->RegisterNamespaceNode(ProcessStatsRunningGet::New(), "get");
         stats->RegisterNamespaceNode(running, "running");
         process->RegisterNamespaceNode(stats, "stats");
         system->RegisterNamespaceNode(process, "process");
@@ -225,11 +236,16 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto quillfs = MakeNamespace("Operations pertaining to the quillfs memory filesytem.");
         // --- quillfs get ---
+        quillfs->RegisterNamespaceNode(QuillfsGet::New(), "get");
         auto ramdisk = MakeNamespace("Operations pertaining to quillfs ramdisks.");
         // --- quillfs ramdisk commands ---
+        ramdisk->RegisterNamespaceNode(QuillfsRamdiskAdd::New(false), "add");
+        ramdisk->RegisterNamespaceNode(QuillfsRamdiskList::New(), "list");
+        ramdisk->RegisterNamespaceNode(QuillfsRamdiskRemove::New(), "remove");
         quillfs->RegisterNamespaceNode(ramdisk, "ramdisk");
         auto tardisk = MakeNamespace("Operations pertaining to quillfs tardisks.");
         // --- quillfs tardisk commands ---
+        tardisk->RegisterNamespaceNode(QuillfsTardiskList::New(), "list");
         quillfs->RegisterNamespaceNode(tardisk, "tardisk");
         system->RegisterNamespaceNode(quillfs, "quillfs");
     }
