@@ -15,11 +15,11 @@ std::string LoadSecret(const std::string& name) {
     if (name.empty()) return std::string();
     std::string line;
     try {
-        errno = 0;
         const std::string path = HostOs::HostFileName(name);
         std::ifstream file;
         file.exceptions(std::ifstream::failbit | std::ifstream::badbit);
         if (path.empty()) throw std::ios_base::failure("outside the host's files");
+        errno = 0;
         file.open(path);
         std::getline(file, line);
     } catch (const std::ios_base::failure&) {

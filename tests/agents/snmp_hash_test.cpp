@@ -19,7 +19,7 @@ constexpr const char* kRfcEngineId = "000000000000000000000002";
 constexpr const char* kMd5Kul = "526f5eed9fcce26f8964c2930787d82b";
 constexpr const char* kShaKul = "6695febc9288e36282235fc7151f128497b38f3f";
 
-void SetUp(const BrixTest::TempHost& host, std::vector<std::string> words) {
+void Configure(const BrixTest::TempHost& host, std::vector<std::string> words) {
     words.insert(words.begin(), "set");
     const auto run = Snmp(host, words);
     ASSERT_EQ(run.status, 0) << run.err;
@@ -48,7 +48,7 @@ class QuietPort {
 
 TEST(SnmpHash, LocalizesWithTheStoredEngineId) {
     BrixTest::TempHost host;
-    SetUp(host, {"--engineid", kRfcEngineId, "--authentication", "MD5"});
+    Configure(host, {"--engineid", kRfcEngineId, "--authentication", "MD5"});
     auto run = Snmp(host, {"hash", "-r", "-A", "maplesyrup"});
     ASSERT_EQ(run.status, 0) << run.err;
     EXPECT_EQ(json::parse(run.out), json({{"auth-hash", kMd5Kul}, {"priv-hash", ""}}));
@@ -56,7 +56,7 @@ TEST(SnmpHash, LocalizesWithTheStoredEngineId) {
     run = host.Cli({"system", "snmp", "hash", "-r", "-A", "maplesyrup"});
     EXPECT_NE(run.out.find(kMd5Kul), std::string::npos) << run.out;
 
-    SetUp(host, {"--authentication", "SHA1", "--privacy", "AES128"});
+    Configure(host, {"--authentication", "SHA1", "--privacy", "AES128"});
     run = Snmp(host, {"hash", "-r", "-A", "maplesyrup", "-X", "maplesyrup"});
     ASSERT_EQ(run.status, 0) << run.err;
     EXPECT_EQ(json::parse(run.out),
@@ -66,9 +66,9 @@ TEST(SnmpHash, LocalizesWithTheStoredEngineId) {
 
 TEST(SnmpHash, DefaultEngineIdComesFromTheHostUuid) {
     BrixTest::TempHost host;
-    SetUp(host, {"--authentication", "MD5"});
+    Configure(host, {"--authentication", "MD5"});
     const auto defaultId = Snmp(host, {"hash", "-r", "-A", "maplesyrup"});
-    SetUp(host, {"--engineid", "8000b7e5046334643765386139623133"});
+    Configure(host, {"--engineid", "8000b7e5046334643765386139623133"});
     const auto explicitId = Snmp(host, {"hash", "-r", "-A", "maplesyrup"});
     ASSERT_EQ(defaultId.status, 0) << defaultId.err;
     EXPECT_EQ(defaultId.out, explicitId.out);
@@ -114,7 +114,7 @@ TEST(SnmpHash, ChecksInOrder) {
     };
     for (const auto& c : cases) {
         BrixTest::TempHost host;
-        if (!c.setup.empty()) SetUp(host, c.setup);
+        if (!c.setup.empty()) Configure(host, c.setup);
         std::vector<std::string> words{"hash"};
         words.insert(words.end(), c.args.begin(), c.args.end());
         const auto run = Snmp(host, words);
@@ -127,7 +127,7 @@ TEST(SnmpHash, ChecksInOrder) {
 
 TEST(SnmpHash, SecretFilesAreHostFilesReadByTheirFirstLine) {
     BrixTest::TempHost host;
-    SetUp(host, {"--engineid", kRfcEngineId, "--authentication", "MD5", "--privacy", "AES128"});
+    Configure(host, {"--engineid", kRfcEngineId, "--authentication", "MD5", "--privacy", "AES128"});
     WriteFile(host.Root() / "root/auth.txt", "  maplesyrup \t\nsecond line\n");
     WriteFile(host.Root() / "root/priv.txt", "maplesyrup");
     WriteFile(host.Root() / "root/seven.txt", " 1234567 \nmore");
@@ -172,7 +172,7 @@ TEST(SnmpTestCommand, CountsTargetsAndRequestsTheWarmStart) {
     };
     for (const auto& c : cases) {
         BrixTest::TempHost host;
-        if (!c.setup.empty()) SetUp(host, c.setup);
+        if (!c.setup.empty()) Configure(host, c.setup);
         const auto run = Snmp(host, {"test"});
         ASSERT_EQ(run.status, 0) << run.err;
         EXPECT_EQ(
@@ -194,9 +194,10 @@ TEST(SnmpTestCommand, DeliveryFailuresAreReported) {
     const std::string at = "127.0.0.1@" + quiet.Port();
     BrixTest::TempHost host;
     // Keys localized for another engine than the agent's, and a receiver that never answers.
-    SetUp(host, {"-E", "0x0102030405", "-R",
-                 std::string("trapper/MD5/") + kMd5Kul + "/none/-/0x" + kRfcEngineId, "-i",
-                 at + "/trapper/auth/trap," + at + "/trapper/none/inform", "-t", at + "/public"});
+    Configure(host,
+              {"-E", "0x0102030405", "-R",
+               std::string("trapper/MD5/") + kMd5Kul + "/none/-/0x" + kRfcEngineId, "-i",
+               at + "/trapper/auth/trap," + at + "/trapper/none/inform", "-t", at + "/public"});
     const auto run = Snmp(host, {"test"});
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(json::parse(run.out), json({{"comments", json::array()}}));
@@ -213,13 +214,14 @@ TEST(SnmpTestCommand, DeliveryFailuresAreReported) {
 
 TEST(SnmpTestCommand, UserChecks) {
     BrixTest::TempHost host;
-    SetUp(host, {"-E", kRfcEngineId, "-a", "MD5", "-x", "AES128"});
+    Configure(host, {"-E", kRfcEngineId, "-a", "MD5", "-x", "AES128"});
     const auto hash = Snmp(host, {"hash", "-r", "-A", "maplesyrup", "-X", "privsecret"});
     ASSERT_EQ(hash.status, 0) << hash.err;
     const std::string authHash = json::parse(hash.out)["auth-hash"];
     const std::string privHash = json::parse(hash.out)["priv-hash"];
-    SetUp(host, {"-u", "alice/" + authHash + "/" + privHash + "/priv,carl/" + authHash + "/-/auth",
-                 "-R", "rita/SHA1/" + std::string(kShaKul) + "/none/-/" + kRfcEngineId});
+    Configure(host,
+              {"-u", "alice/" + authHash + "/" + privHash + "/priv,carl/" + authHash + "/-/auth",
+               "-R", "rita/SHA1/" + std::string(kShaKul) + "/none/-/" + kRfcEngineId});
     WriteFile(host.Root() / "root/auth.txt", "maplesyrup\n");
 
     struct Case {
