@@ -240,7 +240,9 @@ void FormatTable(const MetaList& list, const FormatContext& context, std::ostrea
     const MetaStruct* prototype = ElementPrototype(list, context.prototype.get());
     const MetaStruct* first =
         list.GetElements().empty() ? nullptr : AsStruct(list.GetElements().front().get());
-    const MetaStruct* shape = prototype ? prototype : first;
+    // A prototype without fields (only a name) leaves the columns to the first row.
+    const MetaStruct* shape = prototype && !prototype->GetFields().empty() ? prototype : first;
+    if (!shape) shape = prototype;
     const std::string structName = shape ? shape->GetName() : std::string();
 
     std::vector<std::string> columns = SplitNames(Hint(context.hints, "table-columns"));

@@ -228,6 +228,16 @@ TEST(Table, WithoutTerminalNothingIsCut) {
     EXPECT_NE(run.out.find("1     " + longName + "\n"), std::string::npos) << run.out;
 }
 
+TEST(Table, PrototypeWithoutFieldsTakesColumnsFromTheFirstRow) {
+    auto list = MetaObj::MetaList::New(MetaObj::META_STRUCT, MetaObj::MetaStruct::New("Disk"));
+    list->Add(Disk("d", 1, true, {}));
+    auto run = Show(list, nullptr, {}, "table");
+    EXPECT_EQ(run.out,
+              "Mounted  Name  Size  Tags\n"
+              "-------  ----  ----  ----\n"
+              "true     d     1\n");
+}
+
 TEST(Default, CommandsFormatterUnlessOverridden) {
     auto run = Show(Disks(), nullptr, kDiskHints, "", "table");
     EXPECT_EQ(run.out.rfind("Name ", 0), 0u) << run.out;

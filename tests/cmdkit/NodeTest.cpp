@@ -138,6 +138,7 @@ TEST(ShellCmd, SplitsOnWhitespaceAndCallsTheInstalledRunner) {
 }
 
 TEST(ShellCmd, DefaultRunnerCapturesOutputAndStatus) {
+    AutoCli::SetHostCommandRunner(nullptr);  // the host library may have installed its own
     std::string output;
     EXPECT_EQ(AutoCli::AutoCli_ShellCmdWithKvUsername("/bin/echo hello  world", "u", output, ""),
               0);
