@@ -77,7 +77,8 @@ TEST(SnmpBer, Encodings) {
 TEST(SnmpBer, DecodeRoundTripsAndRefusals) {
     for (const int64_t value :
          {0LL, 1LL, -1LL, 127LL, 128LL, -129LL, 65535LL, -2147483648LL, 9007199254740993LL}) {
-        Ber::Reader reader(Ber::Integer(value));
+        const std::string encoded = Ber::Integer(value);
+        Ber::Reader reader(encoded);
         EXPECT_EQ(reader.ReadInteger(), value);
         EXPECT_TRUE(reader.AtEnd());
     }
