@@ -73,6 +73,10 @@
 #include "memfs/QuillfsTardiskList.h"
 
 // --- agents: snmp ---
+#include "agents/SnmpAgentGet.h"
+#include "agents/SnmpAgentHash.h"
+#include "agents/SnmpAgentSet.h"
+#include "agents/SnmpAgentTest.h"
 
 // --- agents: slp, wbem ---
 
@@ -289,6 +293,10 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
         auto snmp =
             MakeNamespace("Commands pertaining to SNMPv1/v2c/v3 Agent configuration.");
         // --- snmp commands ---
+        snmp->RegisterNamespaceNode(SnmpAgentSet::New(), "set");
+        snmp->RegisterNamespaceNode(SnmpAgentGet::New(), "get");
+        snmp->RegisterNamespaceNode(SnmpAgentTest::New(), "test");
+        snmp->RegisterNamespaceNode(SnmpAgentHash::New(), "hash");
         system->RegisterNamespaceNode(snmp, "snmp");
     }
     {
