@@ -21,6 +21,8 @@ public:
     // --- modules ---
 
     // --- agents ---
+    // The WBEM services' configuration, read when this is called.
+    std::unique_ptr<WbemAgentConfig> GetWbemAgentConfig();
 };
 
 }  // namespace HostCtl::System
