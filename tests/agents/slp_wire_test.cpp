@@ -26,18 +26,20 @@ TEST(SlpWire, ServiceRequestBytes) {
     request.multicast = true;
     request.previousResponders = "10.0.0.1";
     request.serviceType = "service:wbem";
-    const Bytes expected =
-        {
-            2,    1,    0,   0,   59,  // version, SrvRqst, length
-            0x20, 0,                   // request-multicast
-            0,    0,    0,             // no extension
-            0x12, 0x34,                // XID
-            0,    2,    'e', 'n',      // language
-            0,    8,    '1', '0', '.', '0', '.', '0', '.', '1', 0,   12,
-            's',  'e',  'r', 'v', 'i', 'c', 'e', ':', 'w', 'b', 'e', 'm',
-            0,    7,    'D', 'E', 'F', 'A', 'U', 'L', 'T', 0,   0,  // predicate
-            0,    0,                                                // SPI
-        };
+    // clang-format off
+    const Bytes expected = {
+        2, 1, 0, 0, 53,  // version, SrvRqst, length
+        0x20, 0,         // request-multicast
+        0, 0, 0,         // no extension
+        0x12, 0x34,      // XID
+        0, 2, 'e', 'n',  // language
+        0, 8, '1', '0', '.', '0', '.', '0', '.', '1',
+        0, 12, 's', 'e', 'r', 'v', 'i', 'c', 'e', ':', 'w', 'b', 'e', 'm',
+        0, 7, 'D', 'E', 'F', 'A', 'U', 'L', 'T',
+        0, 0,  // predicate
+        0, 0,  // SPI
+    };
+    // clang-format on
     EXPECT_EQ(BuildServiceRequest(request), expected);
     request.multicast = false;
     EXPECT_EQ(BuildServiceRequest(request)[5], 0);
