@@ -233,7 +233,6 @@ TEST(Wbem, FaultsBecomeMessages) {
     };
     const Case cases[] = {
         {"HostCtl::HostFactory::GetHost", {"get"}, ""},
-        {"HostCtl::Host::GetSystemInfo", {"provider", "list"}, ""},
         {"HostCtl::System::SystemInfo::GetWbemAgentConfig", {"get"}, ""},
         {"HostCtl::System::WbemAgentConfig::IsEnabled", {"get"}, ""},
         {"HostCtl::System::WbemAgentConfig::GetLogLevel", {"get"}, ""},
