@@ -39,7 +39,7 @@ struct Request {
 };
 
 class Responder {
-  public:
+public:
     Responder(std::vector<Service> services, Behaviour behaviour = Behaviour::Answer);
     ~Responder();
     Responder(const Responder&) = delete;
@@ -53,7 +53,7 @@ class Responder {
                                              uint16_t errorCode = 0);
     static std::vector<uint8_t> AgentAdvert(uint16_t xid, const std::string& url);
 
-  private:
+private:
     void Run();
     void HandleUdp();
     void HandleTcp();

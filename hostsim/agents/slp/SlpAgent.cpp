@@ -49,6 +49,12 @@ constexpr const char* kSetSearchService = "HostCtl::System::SlpAgent::SetSearchS
 constexpr const char* kSetSearchTcp = "HostCtl::System::SlpAgent::SetSearchTcp";
 constexpr const char* kGetStats = "HostCtl::System::SlpAgent::GetStats";
 
+constexpr const char* kDefaultService = "service-agent";
+constexpr int64_t kDefaultWaitMs = 1500;
+constexpr int64_t kMaxWaitMs = 60'000;
+// Largest reply accepted over TCP; anything longer is not an answer to a service request.
+constexpr uint32_t kMaxTcpReply = 1 << 20;
+
 const bool registered = [] {
     BrixSim::RegisterOperations({kFactory, kSearch, kSearchNode, kResetSearch, kSetSearchPort,
                                  kSetSearchService, kSetSearchTcp, kGetStats});
@@ -56,23 +62,17 @@ const bool registered = [] {
     return BrixSim::RegisterTables({"slp-ua", "", [](Store& store) {
                                         store.SetValue("slp.ua.interface", "");
                                         store.SetValue("slp.ua.scopes", "DEFAULT");
-                                        store.SetInt("slp.ua.multicast_wait_ms", 1500);
-                                        store.SetInt("slp.ua.unicast_wait_ms", 1500);
+                                        store.SetInt("slp.ua.multicast_wait_ms", kDefaultWaitMs);
+                                        store.SetInt("slp.ua.unicast_wait_ms", kDefaultWaitMs);
                                     }});
 }();
-
-constexpr const char* kDefaultService = "service-agent";
-constexpr int64_t kDefaultWaitMs = 1500;
-constexpr int64_t kMaxWaitMs = 60'000;
-// Largest reply accepted over TCP; anything longer is not an answer to a service request.
-constexpr uint32_t kMaxTcpReply = 1 << 20;
 
 std::string ErrnoText(int error) {
     return std::strerror(error);
 }
 
 class Socket {
-  public:
+public:
     explicit Socket(int fd) : fd_(fd) {}
     ~Socket() {
         if (fd_ >= 0) ::close(fd_);
@@ -81,7 +81,7 @@ class Socket {
     Socket& operator=(const Socket&) = delete;
     int Fd() const { return fd_; }
 
-  private:
+private:
     int fd_;
 };
 
@@ -120,7 +120,7 @@ bool WaitReadable(int fd, Clock::time_point deadline) {
     }
 }
 
-// True for a well-formed answer to request `xid`, of a kind that lists services.
+// True for a well-formed reply to the request with transaction id `xid`.
 bool Answers(const std::optional<Reply>& reply, uint16_t xid) {
     return reply && reply->xid == xid;
 }
@@ -132,7 +132,7 @@ void AddEntries(const Reply& reply, std::set<std::string>& seen, std::vector<SLP
 }
 
 class SlpAgentImpl final : public HostCtl::System::SlpAgent {
-  public:
+public:
     void Search(std::vector<SLPSvc>& services) override {
         Store::Get().Check(kSearch);
         services.clear();
@@ -260,7 +260,7 @@ class SlpAgentImpl final : public HostCtl::System::SlpAgent {
         ReadDaemonStats(stats);
     }
 
-  private:
+private:
     [[noreturn]] static void Fail(const std::string& message) { throw HostCtlException(message); }
 
     // Service types are URL schemes below "service:"; a bare name is taken as such a type.

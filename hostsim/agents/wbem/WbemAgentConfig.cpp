@@ -146,7 +146,7 @@ void JournalService(Store& store, const char* service, const char* action) {
 }
 
 class WbemAgentConfigImpl final : public HostCtl::System::WbemAgentConfig {
-  public:
+public:
     WbemAgentConfigImpl(Settings settings, std::vector<Provider> providers)
         : settings_(std::move(settings)), providers_(std::move(providers)) {}
 
@@ -286,7 +286,7 @@ class WbemAgentConfigImpl final : public HostCtl::System::WbemAgentConfig {
         reset_ = true;
     }
 
-  private:
+private:
     // Binds the pending value of `column` to parameter 1; returns it as text for the journal.
     std::string Bind(BrixSim::Stmt& update, Column column) const {
         switch (column) {
