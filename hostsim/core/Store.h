@@ -5,9 +5,11 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <initializer_list>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <variant>
 #include <vector>
@@ -35,6 +37,11 @@ public:
     Stmt& Bind(int index, int64_t value);
     Stmt& Bind(int index, int value) { return Bind(index, static_cast<int64_t>(value)); }
     Stmt& Bind(int index, bool value) { return Bind(index, static_cast<int64_t>(value)); }
+    // Any other integer type (long long, unsigned, size_t, ...), stored as a signed 64-bit value.
+    template <class T, class = std::enable_if_t<std::is_integral_v<T>>>
+    Stmt& Bind(int index, T value) {
+        return Bind(index, static_cast<int64_t>(value));
+    }
     Stmt& BindNull(int index);
 
     // True while a row is available.

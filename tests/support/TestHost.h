@@ -35,12 +35,20 @@ public:
     std::vector<nlohmann::json> Journal() const;
     // Arms a fault: `brixsim fault set OPERATION MESSAGE`.
     void Fault(const std::string& operation, const std::string& message) const;
+    // Arms a fault for `times` calls (0: until cleared), with a detail text when not empty.
+    void Fault(const std::string& operation, const std::string& message, int times,
+               const std::string& detail = "") const;
+    // Disarms every fault.
+    void ClearFaults() const;
     // Merges `patch` into the exported state and imports it (tables replaced as given).
     void Import(const nlohmann::json& state) const;
     nlohmann::json Export() const;
 
 private:
     std::filesystem::path root_;
+    // The environment this host replaced, restored when it goes.
+    std::string oldRoot_, oldScale_;
+    bool hadRoot_ = false, hadScale_ = false;
 };
 
 // Runs a program with arguments, capturing its output.

@@ -1,0 +1,130 @@
+// Runs host command lines for the framework: the program is the file at its host path under the
+// root or, failing that, the simulator's own build of it (brixsim-<name> beside the tools).
+#include <dlfcn.h>
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <exception>
+#include <filesystem>
+
+#include "cmdkit/AutoCli.h"
+#include "core/Store.h"
+
+extern char** environ;
+
+namespace {
+
+namespace fs = std::filesystem;
+
+bool IsExecutableFile(const fs::path& path) {
+    struct stat info;
+    return ::stat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode) &&
+           ::access(path.c_str(), X_OK) == 0;
+}
+
+// Where the simulator's host programs are: $BRIXSIM_PROGRAM_DIR, else the bin folder beside
+// the folder of this library.
+fs::path ProgramDir() {
+    if (const char* dir = getenv("BRIXSIM_PROGRAM_DIR"); dir && *dir) return dir;
+    Dl_info info;
+    if (dladdr(reinterpret_cast<void*>(&ProgramDir), &info) == 0 || !info.dli_fname) return {};
+    std::error_code ec;
+    const fs::path library = fs::canonical(info.dli_fname, ec);
+    if (ec) return {};
+    return library.parent_path().parent_path() / "bin";
+}
+
+// Runs `program` with `argv`, collecting standard output and error together.
+int Spawn(const fs::path& program, const std::vector<std::string>& argv, std::string& output) {
+    int pipeFds[2];
+    if (pipe2(pipeFds, O_CLOEXEC) != 0) {
+        output = argv[0] + ": " + std::strerror(errno) + "\n";
+        return 126;
+    }
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], 1);
+    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], 2);
+
+    std::vector<char*> args;
+    for (const auto& arg : argv) args.push_back(const_cast<char*>(arg.c_str()));
+    args.push_back(nullptr);
+
+    pid_t pid = 0;
+    const int error = posix_spawn(&pid, program.c_str(), &actions, nullptr, args.data(), environ);
+    posix_spawn_file_actions_destroy(&actions);
+    ::close(pipeFds[1]);
+    if (error != 0) {
+        ::close(pipeFds[0]);
+        output = argv[0] + ": " + std::strerror(error) + "\n";
+        return error == ENOENT ? 127 : 126;
+    }
+    char buffer[4096];
+    for (;;) {
+        const ssize_t got = ::read(pipeFds[0], buffer, sizeof buffer);
+        if (got > 0) {
+            output.append(buffer, static_cast<size_t>(got));
+        } else if (got == 0 || errno != EINTR) {
+            break;
+        }
+    }
+    ::close(pipeFds[0]);
+    int status = 0;
+    while (waitpid(pid, &status, 0) < 0) {
+        if (errno != EINTR) return 126;
+    }
+    if (WIFEXITED(status)) return WEXITSTATUS(status);
+    if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
+    return 126;
+}
+
+int RunHostCommand(const std::vector<std::string>& argv, const std::string& user,
+                   std::string& output) {
+    output.clear();
+    if (argv.empty() || argv[0].empty()) {
+        output = "no program given\n";
+        return 127;
+    }
+    int status = 127;
+    try {
+        auto& store = BrixSim::Store::Get();
+        const std::string& name = argv[0];
+        std::optional<fs::path> real;
+        if (name.front() == '/') real = store.Resolve(name);
+        if (name.front() != '/') {
+            output = name + ": not an absolute host path\n";
+        } else if (!real) {
+            output = name + ": Permission denied\n";
+            status = 126;
+        } else if (IsExecutableFile(*real)) {
+            status = Spawn(*real, argv, output);
+        } else if (const fs::path builtin =
+                       ProgramDir() / ("brixsim-" + fs::path(name).filename().string());
+                   !fs::path(name).filename().empty() && IsExecutableFile(builtin)) {
+            status = Spawn(builtin, argv, output);
+        } else {
+            output = name + ": No such file or directory\n";
+        }
+        store.Write([&] {
+            store.Journal("exec", {{"argv", argv}, {"user", user}, {"status", int64_t{status}}});
+        });
+    } catch (const std::exception& e) {
+        output += std::string(e.what()) + "\n";
+        if (status == 0) status = 126;
+    }
+    return status;
+}
+
+const bool installed = [] {
+    CmdKit::AutoCli::SetHostCommandRunner(&RunHostCommand);
+    return true;
+}();
+
+}  // namespace

@@ -1,0 +1,75 @@
+// Registries filled by every area at static initialisation. Each lives in a function-local
+// static so that registrations from other translation units work whatever their order.
+#include <set>
+#include <stdexcept>
+
+#include "core/Registry.h"
+
+namespace BrixSim {
+
+namespace {
+
+std::vector<TableSet>& Tables() {
+    static std::vector<TableSet> tables;
+    return tables;
+}
+
+std::set<std::string>& Operations() {
+    static std::set<std::string> operations;
+    return operations;
+}
+
+std::map<uint32_t, SysinfoNode>& SysinfoNodes() {
+    static std::map<uint32_t, SysinfoNode> nodes;
+    return nodes;
+}
+
+std::map<std::string, FileSystemType>& FileSystemTypes() {
+    static std::map<std::string, FileSystemType> types;
+    return types;
+}
+
+}  // namespace
+
+bool RegisterTables(TableSet tables) {
+    for (const auto& existing : Tables()) {
+        if (existing.name == tables.name) {
+            throw std::logic_error("table set registered twice: " + tables.name);
+        }
+    }
+    Tables().push_back(std::move(tables));
+    return true;
+}
+
+bool RegisterOperations(std::initializer_list<const char*> operations) {
+    for (const char* operation : operations) Operations().insert(operation);
+    return true;
+}
+
+bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler) {
+    SysinfoNodes()[node] = std::move(handler);
+    return true;
+}
+
+bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler) {
+    FileSystemTypes()[fstype] = std::move(handler);
+    return true;
+}
+
+const std::vector<TableSet>& RegisteredTables() {
+    return Tables();
+}
+
+std::vector<std::string> RegisteredOperations() {
+    return {Operations().begin(), Operations().end()};
+}
+
+const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes() {
+    return SysinfoNodes();
+}
+
+const std::map<std::string, FileSystemType>& RegisteredFileSystemTypes() {
+    return FileSystemTypes();
+}
+
+}  // namespace BrixSim

@@ -1,0 +1,21 @@
+// The core's registries, read by the store, the OS seam and the brixsim tool.
+#pragma once
+
+#include <cstdint>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "core/Hooks.h"
+#include "core/Store.h"
+
+namespace BrixSim {
+
+// Every area's tables, in registration order.
+const std::vector<TableSet>& RegisteredTables();
+// Every operation name that can be made to fail, sorted and without duplicates.
+std::vector<std::string> RegisteredOperations();
+const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes();
+const std::map<std::string, FileSystemType>& RegisteredFileSystemTypes();
+
+}  // namespace BrixSim

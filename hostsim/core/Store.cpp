@@ -1,0 +1,494 @@
+// The simulated host's store: one SQLite database (WAL, durable commits) under the host root.
+#include "core/Store.h"
+
+#include <sqlite3.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdlib>
+#include <memory>
+#include <mutex>
+#include <nlohmann/json.hpp>
+#include <stdexcept>
+#include <system_error>
+#include <thread>
+
+#include "core/Registry.h"
+#include "hostctl/HostCtlException.h"
+
+namespace BrixSim {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+// How long a process waits for another one's write transaction before giving up.
+constexpr int kBusyTimeoutMs = 10000;
+
+constexpr const char* kCoreSchema =
+    "CREATE TABLE IF NOT EXISTS host (key TEXT PRIMARY KEY, value TEXT NOT NULL);"
+    "CREATE TABLE IF NOT EXISTS faults (op TEXT PRIMARY KEY, message TEXT NOT NULL,"
+    " detail TEXT, remaining INTEGER);"
+    "CREATE TABLE IF NOT EXISTS journal (seq INTEGER PRIMARY KEY AUTOINCREMENT,"
+    " record TEXT NOT NULL);"
+    "CREATE TABLE IF NOT EXISTS features (entry INTEGER PRIMARY KEY"
+    " CHECK (entry BETWEEN 0 AND 255), state INTEGER NOT NULL);"
+    "CREATE TABLE IF NOT EXISTS meta (key TEXT PRIMARY KEY, value TEXT NOT NULL);";
+
+constexpr const char* kSchemaVersion = "1";
+
+std::unique_ptr<Store>& Instance() {
+    static std::unique_ptr<Store> instance;
+    return instance;
+}
+
+// Recursive: a seed run while the store opens may itself ask for the store.
+std::recursive_mutex& InstanceMutex() {
+    static std::recursive_mutex mutex;
+    return mutex;
+}
+
+// Counted faults that fired inside a transaction. A fault usually aborts the transaction it
+// fired in; the firing still counts, so rolled-back decrements are applied again.
+std::vector<std::string>& PendingHits() {
+    static std::vector<std::string> hits;
+    return hits;
+}
+
+// A stable digest of every schema, so an up-to-date host skips the schema transaction.
+std::string SchemaFingerprint() {
+    uint64_t hash = 1469598103934665603ULL;
+    auto mix = [&hash](std::string_view text) {
+        for (unsigned char c : text) {
+            hash ^= c;
+            hash *= 1099511628211ULL;
+        }
+        hash ^= 0xff;
+        hash *= 1099511628211ULL;
+    };
+    mix(kSchemaVersion);
+    mix(kCoreSchema);
+    for (const auto& tables : RegisteredTables()) {
+        mix(tables.name);
+        mix(tables.schema);
+    }
+    char text[17];
+    snprintf(text, sizeof text, "%016llx", static_cast<unsigned long long>(hash));
+    return text;
+}
+
+nlohmann::ordered_json ToJson(const Value& value) {
+    return std::visit(
+        [](const auto& v) -> nlohmann::ordered_json {
+            using T = std::decay_t<decltype(v)>;
+            if constexpr (std::is_same_v<T, std::nullptr_t>) {
+                return nullptr;
+            } else {
+                return v;
+            }
+        },
+        value);
+}
+
+void ExecRaw(sqlite3* db, std::string_view sql) {
+    char* error = nullptr;
+    const std::string text(sql);
+    if (sqlite3_exec(db, text.c_str(), nullptr, nullptr, &error) != SQLITE_OK) {
+        std::string message = error ? error : sqlite3_errmsg(db);
+        sqlite3_free(error);
+        throw std::runtime_error("host store: " + message);
+    }
+}
+
+void DecrementFault(Store& store, const std::string& operation) {
+    store.Prepare("UPDATE faults SET remaining = remaining - 1 WHERE op = ? AND remaining > 0")
+        .Bind(1, operation)
+        .Run();
+    store.Prepare("DELETE FROM faults WHERE op = ? AND remaining <= 0").Bind(1, operation).Run();
+}
+
+}  // namespace
+
+// ---------------------------------------------------------------------------------------------
+// Stmt
+
+Stmt::Stmt(sqlite3* db, std::string_view sql) : db_(db) {
+    if (!db_) throw std::runtime_error("host store: not open");
+    if (sqlite3_prepare_v2(db_, sql.data(), static_cast<int>(sql.size()), &stmt_, nullptr) !=
+        SQLITE_OK) {
+        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)) + " in \"" +
+                                 std::string(sql) + "\"");
+    }
+    if (!stmt_) throw std::runtime_error("host store: empty statement");
+}
+
+Stmt::~Stmt() {
+    sqlite3_finalize(stmt_);
+}
+
+Stmt::Stmt(Stmt&& other) noexcept : db_(other.db_), stmt_(other.stmt_) {
+    other.stmt_ = nullptr;
+}
+
+Stmt& Stmt::Bind(int index, std::string_view text) {
+    const char* data = text.data() ? text.data() : "";
+    if (sqlite3_bind_text(stmt_, index, data, static_cast<int>(text.size()), SQLITE_TRANSIENT) !=
+        SQLITE_OK) {
+        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+    }
+    return *this;
+}
+
+Stmt& Stmt::Bind(int index, int64_t value) {
+    if (sqlite3_bind_int64(stmt_, index, value) != SQLITE_OK) {
+        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+    }
+    return *this;
+}
+
+Stmt& Stmt::BindNull(int index) {
+    if (sqlite3_bind_null(stmt_, index) != SQLITE_OK) {
+        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+    }
+    return *this;
+}
+
+bool Stmt::Step() {
+    const int rc = sqlite3_step(stmt_);
+    if (rc == SQLITE_ROW) return true;
+    if (rc == SQLITE_DONE) return false;
+    const std::string message = sqlite3_errmsg(db_);
+    sqlite3_reset(stmt_);
+    throw std::runtime_error("host store: " + message);
+}
+
+void Stmt::Run() {
+    while (Step()) {
+    }
+    sqlite3_reset(stmt_);
+}
+
+void Stmt::Reset() {
+    sqlite3_reset(stmt_);
+    sqlite3_clear_bindings(stmt_);
+}
+
+std::string Stmt::Text(int column) const {
+    const auto* text = sqlite3_column_text(stmt_, column);
+    if (!text) return {};
+    return std::string(reinterpret_cast<const char*>(text),
+                       static_cast<size_t>(sqlite3_column_bytes(stmt_, column)));
+}
+
+int64_t Stmt::Int(int column) const {
+    return sqlite3_column_int64(stmt_, column);
+}
+
+bool Stmt::IsNull(int column) const {
+    return sqlite3_column_type(stmt_, column) == SQLITE_NULL;
+}
+
+// ---------------------------------------------------------------------------------------------
+// Store
+
+Store& Store::Get() {
+    std::lock_guard lock(InstanceMutex());
+    auto& instance = Instance();
+    if (!instance) {
+        instance.reset(new Store(DefaultRoot()));
+        try {
+            instance->Open();
+        } catch (...) {
+            instance.reset();
+            throw;
+        }
+    }
+    return *instance;
+}
+
+void Store::Close() {
+    std::lock_guard lock(InstanceMutex());
+    Instance().reset();
+    PendingHits().clear();
+}
+
+fs::path Store::DefaultRoot() {
+    if (const char* root = getenv("BRIX_HOST_ROOT"); root && *root) {
+        return fs::absolute(root).lexically_normal();
+    }
+    fs::path state;
+    if (const char* xdg = getenv("XDG_STATE_HOME"); xdg && *xdg) {
+        state = xdg;
+    } else if (const char* home = getenv("HOME"); home && *home) {
+        state = fs::path(home) / ".local" / "state";
+    } else {
+        throw std::runtime_error("host store: neither BRIX_HOST_ROOT nor HOME is set");
+    }
+    return (fs::absolute(state) / "brixsim" / "default").lexically_normal();
+}
+
+Store::Store(fs::path root) : root_(std::move(root)) {}
+
+Store::~Store() {
+    if (db_) sqlite3_close_v2(db_);
+}
+
+void Store::Open() {
+    std::error_code ec;
+    fs::create_directories(root_, ec);
+    if (ec) {
+        throw std::runtime_error("host store: cannot create host root " + root_.string() + ": " +
+                                 ec.message());
+    }
+    root_ = fs::canonical(root_, ec);
+    if (ec) throw std::runtime_error("host store: " + ec.message());
+
+    const fs::path file = root_ / "host.db";
+    if (sqlite3_open_v2(file.c_str(), &db_, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, nullptr) !=
+        SQLITE_OK) {
+        const std::string message = db_ ? sqlite3_errmsg(db_) : "out of memory";
+        sqlite3_close_v2(db_);
+        db_ = nullptr;
+        throw std::runtime_error("host store: cannot open " + file.string() + ": " + message);
+    }
+    sqlite3_busy_timeout(db_, kBusyTimeoutMs);
+    // Switching a new database to WAL needs a moment alone with it; another process creating
+    // the same root at once can make this fail briefly.
+    for (int attempt = 0;; ++attempt) {
+        try {
+            Stmt mode(db_, "PRAGMA journal_mode=WAL");
+            if (mode.Step() && mode.Text(0) == "wal") break;
+        } catch (const std::runtime_error&) {
+            if (attempt >= 200) throw;
+        }
+        if (attempt >= 200) throw std::runtime_error("host store: cannot switch to WAL mode");
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }
+    // Every acknowledged change survives a crash or power loss.
+    Exec("PRAGMA synchronous=FULL");
+    Exec("PRAGMA foreign_keys=ON");
+    CreateSchema(true);
+}
+
+void Store::CreateSchema(bool seed) {
+    const std::string fingerprint = SchemaFingerprint();
+    auto upToDate = [&] {
+        Stmt hasMeta(db_, "SELECT 1 FROM sqlite_master WHERE type = 'table' AND name = 'meta'");
+        if (!hasMeta.Step()) return false;
+        Stmt schema(db_, "SELECT value FROM meta WHERE key = 'schema'");
+        return schema.Step() && schema.Text(0) == fingerprint;
+    };
+    if (upToDate()) return;
+
+    Write([&] {
+        Exec(kCoreSchema);
+        for (const auto& tables : RegisteredTables()) Exec(tables.schema);
+        auto isSeeded = [&](const std::string& name) {
+            return Prepare("SELECT 1 FROM meta WHERE key = ?").Bind(1, "seeded:" + name).Step();
+        };
+        auto markSeeded = [&](const std::string& name) {
+            Prepare("INSERT OR REPLACE INTO meta VALUES (?, '1')").Bind(1, "seeded:" + name).Run();
+        };
+        if (seed) {
+            if (!isSeeded("core")) {
+                // Every feature entry off; the clock runs with the machine's.
+                auto feature = Prepare("INSERT OR REPLACE INTO features VALUES (?, 0)");
+                for (int entry = 0; entry < 256; ++entry) {
+                    feature.Bind(1, entry).Run();
+                    feature.Reset();
+                }
+                SetInt("clock.offset", 0);
+                markSeeded("core");
+            }
+            // An area registered after the host was made is seeded on the next open.
+            for (const auto& tables : RegisteredTables()) {
+                if (isSeeded(tables.name)) continue;
+                if (tables.seed) tables.seed(*this);
+                markSeeded(tables.name);
+            }
+        }
+        Prepare("INSERT OR REPLACE INTO meta VALUES ('version', ?)").Bind(1, kSchemaVersion).Run();
+        if (seed) {
+            Prepare("INSERT OR REPLACE INTO meta VALUES ('schema', ?)").Bind(1, fingerprint).Run();
+        }
+    });
+}
+
+std::optional<fs::path> Store::Resolve(std::string_view hostPath) const {
+    if (hostPath.find('\0') != std::string_view::npos) return std::nullopt;
+    std::vector<std::string> parts;
+    size_t start = 0;
+    while (start <= hostPath.size()) {
+        size_t end = hostPath.find('/', start);
+        if (end == std::string_view::npos) end = hostPath.size();
+        const std::string_view part = hostPath.substr(start, end - start);
+        if (part == "..") {
+            if (parts.empty()) return std::nullopt;
+            parts.pop_back();
+        } else if (!part.empty() && part != ".") {
+            parts.emplace_back(part);
+        }
+        start = end + 1;
+    }
+    if (parts.empty()) return root_;
+
+    auto within = [this](const fs::path& path) {
+        auto [rootEnd, pathAt] =
+            std::mismatch(root_.begin(), root_.end(), path.begin(), path.end());
+        (void)pathAt;
+        return rootEnd == root_.end();
+    };
+    fs::path lexical = root_;
+    for (const auto& part : parts) lexical /= part;
+    std::error_code ec;
+    // The folder holding the path, with every symbolic link followed, must be inside the root;
+    // so must the path itself when it is a link (its target is what a read would reach).
+    const fs::path parent = fs::weakly_canonical(lexical.parent_path(), ec);
+    if (ec || !within(parent)) return std::nullopt;
+    const fs::path real = fs::weakly_canonical(lexical, ec);
+    if (ec || !within(real)) return std::nullopt;
+    return parent / parts.back();
+}
+
+void Store::Check(std::string_view operation) {
+    {
+        auto fault = Prepare("SELECT message, detail, remaining FROM faults WHERE op = ?");
+        fault.Bind(1, operation);
+        if (!fault.Step()) return;
+        if (fault.IsNull(2)) {
+            if (fault.IsNull(1)) throw HostCtl::Lib::HostCtlException(fault.Text(0));
+            throw HostCtl::Lib::HostCtlException(fault.Text(0), fault.Text(1));
+        }
+    }
+    // A fault armed for N calls: take one call off it, with the row re-read under the write
+    // lock so that concurrent processes never fire it more than N times.
+    std::optional<HostCtl::Lib::HostCtlException> exception;
+    const std::string op(operation);
+    Write([&] {
+        auto fault = Prepare("SELECT message, detail, remaining FROM faults WHERE op = ?");
+        fault.Bind(1, op);
+        if (!fault.Step()) return;
+        if (fault.IsNull(1)) {
+            exception.emplace(fault.Text(0));
+        } else {
+            exception.emplace(fault.Text(0), fault.Text(1));
+        }
+        if (!fault.IsNull(2)) {
+            DecrementFault(*this, op);
+            if (writeDepth_ > 1) PendingHits().push_back(op);
+        }
+    });
+    if (exception) throw *exception;
+}
+
+void Store::Write(const std::function<void()>& work) {
+    auto& pending = PendingHits();
+    if (writeDepth_ == 0) {
+        Exec("BEGIN IMMEDIATE");
+        writeDepth_ = 1;
+        try {
+            work();
+            Exec("COMMIT");
+        } catch (...) {
+            writeDepth_ = 0;
+            sqlite3_exec(db_, "ROLLBACK", nullptr, nullptr, nullptr);
+            if (!pending.empty()) {
+                const auto hits = std::move(pending);
+                pending.clear();
+                try {
+                    Write([&] {
+                        for (const auto& op : hits) DecrementFault(*this, op);
+                    });
+                } catch (...) {
+                    // The original failure is the one to report.
+                }
+            }
+            throw;
+        }
+        writeDepth_ = 0;
+        pending.clear();
+        return;
+    }
+    const std::string savepoint = "nested" + std::to_string(writeDepth_);
+    const size_t mark = pending.size();
+    Exec("SAVEPOINT " + savepoint);
+    ++writeDepth_;
+    try {
+        work();
+        --writeDepth_;
+        Exec("RELEASE " + savepoint);
+    } catch (...) {
+        writeDepth_ = std::max(1, writeDepth_ - 1);
+        sqlite3_exec(db_, ("ROLLBACK TO " + savepoint).c_str(), nullptr, nullptr, nullptr);
+        sqlite3_exec(db_, ("RELEASE " + savepoint).c_str(), nullptr, nullptr, nullptr);
+        for (size_t i = mark; i < pending.size(); ++i) {
+            try {
+                DecrementFault(*this, pending[i]);
+            } catch (...) {
+            }
+        }
+        throw;
+    }
+}
+
+void Store::Exec(std::string_view sql) {
+    ExecRaw(db_, sql);
+}
+
+std::optional<std::string> Store::GetValue(std::string_view key) {
+    auto row = Prepare("SELECT value FROM host WHERE key = ?");
+    row.Bind(1, key);
+    if (!row.Step()) return std::nullopt;
+    return row.Text(0);
+}
+
+std::string Store::GetValue(std::string_view key, std::string_view fallback) {
+    auto value = GetValue(key);
+    return value ? *value : std::string(fallback);
+}
+
+int64_t Store::GetInt(std::string_view key, int64_t fallback) {
+    auto value = GetValue(key);
+    if (!value || value->empty()) return fallback;
+    char* end = nullptr;
+    errno = 0;
+    const long long number = strtoll(value->c_str(), &end, 10);
+    if (errno != 0 || *end != '\0') return fallback;
+    return number;
+}
+
+void Store::SetValue(std::string_view key, std::string_view value) {
+    Prepare(
+        "INSERT INTO host (key, value) VALUES (?, ?)"
+        " ON CONFLICT (key) DO UPDATE SET value = excluded.value")
+        .Bind(1, key)
+        .Bind(2, value)
+        .Run();
+}
+
+void Store::SetInt(std::string_view key, int64_t value) {
+    SetValue(key, std::to_string(value));
+}
+
+void Store::Journal(std::string_view kind, const Fields& fields) {
+    nlohmann::ordered_json record;
+    record["kind"] = kind;
+    for (const auto& [name, value] : fields) record[name] = ToJson(value);
+    const std::string text =
+        record.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+    Prepare("INSERT INTO journal (record) VALUES (?)").Bind(1, text).Run();
+}
+
+void Store::JournalCall(std::string_view operation, const std::vector<Value>& args) {
+    nlohmann::ordered_json record;
+    record["kind"] = "call";
+    record["op"] = operation;
+    record["args"] = nlohmann::ordered_json::array();
+    for (const auto& arg : args) record["args"].push_back(ToJson(arg));
+    const std::string text =
+        record.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+    Prepare("INSERT INTO journal (record) VALUES (?)").Bind(1, text).Run();
+}
+
+}  // namespace BrixSim

@@ -1,0 +1,55 @@
+// Kernel system-information records, answered by the node handlers the areas register.
+#include "kernctl/Sysinfo.h"
+
+#include "core/Registry.h"
+#include "hostctl/HostCtlException.h"
+
+namespace {
+
+const bool registered =
+    BrixSim::RegisterOperations({"KernCtl::Util::Sysinfo::Get", "KernCtl::Util::Sysinfo::List"});
+
+const BrixSim::SysinfoNode& Node(uint32_t node) {
+    const auto& nodes = BrixSim::RegisteredSysinfoNodes();
+    auto found = nodes.find(node);
+    if (found == nodes.end()) {
+        throw HostCtl::Lib::HostCtlException("Unknown KSI node " + std::to_string(node));
+    }
+    return found->second;
+}
+
+}  // namespace
+
+namespace KernCtl::Util {
+
+Sysinfo::Sysinfo(uint32_t node) : node_(node) {}
+
+void Sysinfo::Get(void* buffer, size_t size) {
+    BrixSim::Store::Get().Check("KernCtl::Util::Sysinfo::Get");
+    const auto& node = Node(node_);
+    if (!node.get) {
+        throw HostCtl::Lib::HostCtlException("KSI node " + std::to_string(node_) +
+                                             " has no records");
+    }
+    node.get(instancePath_, buffer, size);
+}
+
+void Sysinfo::List(std::vector<std::string>& names) {
+    BrixSim::Store::Get().Check("KernCtl::Util::Sysinfo::List");
+    const auto& node = Node(node_);
+    if (!node.list) {
+        throw HostCtl::Lib::HostCtlException("KSI node " + std::to_string(node_) +
+                                             " has no instances");
+    }
+    names = node.list(instancePath_);
+}
+
+void Sysinfo::ResetInstance() {
+    instancePath_.clear();
+}
+
+void Sysinfo::AddInstancePath(const std::string& name) {
+    instancePath_.push_back(name);
+}
+
+}  // namespace KernCtl::Util
