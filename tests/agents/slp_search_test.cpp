@@ -2,7 +2,9 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <map>
 
+#include "brixcli/SystemPlugin.h"
 #include "slp_responder.h"
 #include "support/TestHost.h"
 
@@ -250,18 +252,60 @@ TEST(SlpSearch, FaultsBecomeMessages) {
     }
 }
 
-TEST(SlpSearch, HelpAndTable) {
+TEST(SlpSearch, DeclaredParametersAndTable) {
     BrixTest::TempHost host;
-    auto help = host.Cli({"system", "slp", "search", "--help"});
-    EXPECT_EQ(help.status, 0);
-    for (const char* text : {"Perform SLP search for neighboring services",
-                             "Optional, override the default port value 427.",
-                             "Optional, the service name to search for. Defaults to "
-                             "'service-agent'.",
-                             "Optional, host FQDN or IP address to connect to. Use -P to control "
-                             "protocol used."}) {
-        EXPECT_NE(help.out.find(text), std::string::npos) << text;
+    std::shared_ptr<CmdKit::AutoCli::NamespaceNode> root = CmdKit::AutoCli::Namespace::New();
+    AutoCli_RegisterNamespaces(root);
+    size_t consumed = 0;
+    auto node = root->ResolveNode({"system", "slp", "search"}, consumed);
+    auto search = std::dynamic_pointer_cast<CmdKit::AutoCli::CommandSpec>(node);
+    ASSERT_TRUE(search);
+    EXPECT_EQ(search->GetDescription(), "Perform SLP search for neighboring services");
+    EXPECT_EQ(search->GetDefaultOutputFormatter(), "table");
+    EXPECT_EQ(search->GetDefaultOutputParameters(),
+              (std::map<std::string, std::string>{{"fields:TimeToLive", "TimeToLive,System"}}));
+    EXPECT_EQ(search->GetMetaDataField("type"), "");
+    struct Expected {
+        const char* name;
+        int type;
+        const char* shortName;
+        const char* description;
+    };
+    const Expected expected[] = {
+        {"protocol", 0, "P",
+         "Optional, override unicast protocol: %ENUM%, default tcp, requires -n."},
+        {"port", 1, "p", "Optional, override the default port value 427."},
+        {"node", 0, "n",
+         "Optional, host FQDN or IP address to connect to. Use -P to control protocol used."},
+        {"service", 0, "s",
+         "Optional, the service name to search for. Defaults to 'service-agent'."},
+    };
+    const auto& parameters = search->GetInputSpec()->GetParameters();
+    ASSERT_EQ(parameters.size(), std::size(expected));
+    for (size_t i = 0; i < parameters.size(); ++i) {
+        EXPECT_EQ(parameters[i]->GetName(), expected[i].name);
+        EXPECT_EQ(parameters[i]->GetType(), expected[i].type);
+        EXPECT_EQ(parameters[i]->GetShortName(), expected[i].shortName);
+        EXPECT_EQ(parameters[i]->GetDescription(), expected[i].description);
+        EXPECT_FALSE(parameters[i]->IsRequired());
     }
+    const auto& protocols = parameters[0]->GetConstraint()->GetEnumValues();
+    ASSERT_EQ(protocols.size(), 2u);
+    EXPECT_EQ(protocols[0].value, "tcp");
+    EXPECT_EQ(protocols[1].value, "udp");
+    EXPECT_EQ(protocols[0].description, "");
+    EXPECT_EQ(parameters[1]->GetConstraint()->GetMin(), 0);
+    EXPECT_EQ(parameters[1]->GetConstraint()->GetMax(), 65535);
+
+    auto stats = std::dynamic_pointer_cast<CmdKit::AutoCli::CommandSpec>(
+        root->ResolveNode({"system", "slp", "stats", "get"}, consumed));
+    ASSERT_TRUE(stats);
+    EXPECT_EQ(stats->GetDescription(),
+              "Report operational state of Service Location Protocol Daemon");
+    EXPECT_EQ(stats->GetMetaDataField("type"), "fetcher");
+    EXPECT_EQ(stats->GetDefaultOutputFormatter(), "simple");
+    EXPECT_TRUE(stats->GetInputSpec()->GetParameters().empty());
+
     ShortWaits(host);
     Responder responder(kServices);
     const auto table = host.Cli({"system", "slp", "search", "-n", "127.0.0.1", "-p",

@@ -2,7 +2,9 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <map>
 
+#include "brixcli/SystemPlugin.h"
 #include "support/TestHost.h"
 
 namespace {
@@ -259,23 +261,107 @@ TEST(Wbem, FaultsBecomeMessages) {
     }
 }
 
-TEST(Wbem, HelpTexts) {
+TEST(Wbem, DeclaredCommands) {
     BrixTest::TempHost host;
-    const std::pair<std::vector<std::string>, std::vector<const char*>> cases[] = {
-        {{"system", "wbem", "set", "--help"},
-         {"This command allows the user to set up Brix CIMOM agent.",
-          "Restore the WBEM configuration to factory defaults",
-          "Least detailed logging, Reports only errors."}},
-        {{"system", "wbem", "provider", "set", "--help"},
-         {"This command is used to manage Brix CIMOM providers.", "Specify provider identifier."}},
-        {{"system", "wbem", "provider", "list", "--help"},
-         {"Display WBEM provider configuration."}},
+    std::shared_ptr<CmdKit::AutoCli::NamespaceNode> root = CmdKit::AutoCli::Namespace::New();
+    AutoCli_RegisterNamespaces(root);
+    auto command = [&](std::vector<std::string> words) {
+        size_t consumed = 0;
+        return std::dynamic_pointer_cast<CmdKit::AutoCli::CommandSpec>(
+            root->ResolveNode(words, consumed));
     };
-    for (const auto& [args, texts] : cases) {
-        const auto run = host.Cli(args);
-        EXPECT_EQ(run.status, 0);
-        for (const char* text : texts) EXPECT_NE(run.out.find(text), std::string::npos) << text;
+    struct Parameter {
+        const char* name;
+        int type;
+        const char* shortName;
+        const char* description;
+        bool required;
+    };
+    struct Case {
+        std::vector<std::string> path;
+        const char* description;
+        const char* kind;
+        const char* formatter;
+        std::map<std::string, std::string> hints;
+        std::vector<Parameter> parameters;
+    };
+    const Case cases[] = {
+        {{"system", "wbem", "get"},
+         "Display WBEM Agent configuration.",
+         "fetcher",
+         "simple",
+         {},
+         {}},
+        {{"system", "wbem", "provider", "list"},
+         "Display WBEM provider configuration.",
+         "fetcher",
+         "table",
+         {{"fields:WbemAgentProviderList", "Name,Enabled,Loaded"}},
+         {}},
+        {{"system", "wbem", "provider", "set"},
+         "This command is used to manage Brix CIMOM providers.",
+         "operation",
+         "simple",
+         {},
+         {{"name", 0, "n", "Specify provider identifier.", true},
+          {"enable", 2, "e",
+           "Enable or disable the provider immediately. Values: [yes|no, true|false, 0|1]",
+           false}}},
+        {{"system", "wbem", "set"},
+         "This command allows the user to set up Brix CIMOM agent.",
+         "operation",
+         "simple",
+         {},
+         {{"enable", 2, "e",
+           "Start or stop the WBEM services (sfcbd, openwsmand). Values: [yes|no, true|false, "
+           "0|1]",
+           false},
+          {"ws-man", 2, "W",
+           "Enable or disable the WS-Management service (openwsmand). Enabled by default. Changes "
+           "take effect when --enable is specified.",
+           false},
+          {"auth", 0, "a",
+           "Specify how to authorize incoming requests. Values are password, certificate, "
+           "password is by default. Changes take effect when --enable is specified.",
+           false},
+          {"port", 1, "p",
+           "Set the TCP port on which the CIMOM listens for requests. The default is 5989", false},
+          {"loglevel", 0, "l", "Syslog logging level: debug|info|warning|error", false},
+          {"reset", 3, "r", "Restore the WBEM configuration to factory defaults", false}}},
+    };
+    for (const auto& c : cases) {
+        const auto spec = command(c.path);
+        ASSERT_TRUE(spec) << c.description;
+        EXPECT_EQ(spec->GetDescription(), c.description);
+        EXPECT_EQ(spec->GetMetaDataField("type"), c.kind);
+        EXPECT_EQ(spec->GetDefaultOutputFormatter(), c.formatter) << c.description;
+        EXPECT_EQ(spec->GetDefaultOutputParameters(), c.hints) << c.description;
+        const auto& parameters = spec->GetInputSpec()->GetParameters();
+        ASSERT_EQ(parameters.size(), c.parameters.size()) << c.description;
+        for (size_t i = 0; i < parameters.size(); ++i) {
+            EXPECT_EQ(parameters[i]->GetName(), c.parameters[i].name);
+            EXPECT_EQ(parameters[i]->GetType(), c.parameters[i].type);
+            EXPECT_EQ(parameters[i]->GetShortName(), c.parameters[i].shortName);
+            EXPECT_EQ(parameters[i]->GetDescription(), c.parameters[i].description);
+            EXPECT_EQ(parameters[i]->IsRequired(), c.parameters[i].required);
+        }
     }
+    const auto set = command({"system", "wbem", "set"})->GetInputSpec();
+    EXPECT_EQ(set->FindParameter("port")->GetConstraint()->GetMax(), 65525);
+    EXPECT_EQ(set->FindParameter("port")->GetConstraint()->GetMin(), 0);
+    const auto& levels = set->FindParameter("loglevel")->GetConstraint()->GetEnumValues();
+    const std::pair<const char*, const char*> expectedLevels[] = {
+        {"debug", "Most detailed logging level."},
+        {"info", "Reports normal actions in addition to warnings, events."},
+        {"warning", "Reports only warnings or errors."},
+        {"error", "Least detailed logging, Reports only errors."},
+    };
+    ASSERT_EQ(levels.size(), std::size(expectedLevels));
+    for (size_t i = 0; i < levels.size(); ++i) {
+        EXPECT_EQ(levels[i].value, expectedLevels[i].first);
+        EXPECT_EQ(levels[i].description, expectedLevels[i].second);
+    }
+    EXPECT_FALSE(set->FindParameter("auth")->GetConstraint());
 }
 
 }  // namespace
