@@ -5,6 +5,9 @@
 #include <map>
 
 #include "brixcli/SystemPlugin.h"
+#include "hostctl/Host.h"
+#include "hostctl/SystemInfo.h"
+#include "hostctl/WbemAgentConfig.h"
 #include "support/TestHost.h"
 
 namespace {
@@ -259,6 +262,30 @@ TEST(Wbem, FaultsBecomeMessages) {
         EXPECT_TRUE(WbemJournal(host).empty()) << c.operation;
         EXPECT_EQ(Get(host), kSeeded) << c.operation;
     }
+}
+
+TEST(Wbem, ConcurrentCommitsKeepEachOthersChanges) {
+    BrixTest::TempHost host;
+    // Two configuration objects read the same state; each commits only what it changed.
+    auto first = HostCtl::HostFactory::GetHost()->GetSystemInfo();
+    auto second = HostCtl::HostFactory::GetHost()->GetSystemInfo();
+    auto a = first->GetWbemAgentConfig();
+    auto b = second->GetWbemAgentConfig();
+    a->SetPort(6000);
+    a->SetProviderEnabled("brix_network", false);
+    b->SetLogLevel("info");
+    b->SetProviderEnabled("tamsin_raidmon", true);
+    a->Commit();
+    b->Commit();
+    auto expected = kSeeded;
+    expected["Port"] = 6000;
+    expected["Log level"] = "info";
+    EXPECT_EQ(Get(host), expected);
+    const auto providers = Providers(host);
+    EXPECT_EQ(providers[4]["Enabled"], false);
+    EXPECT_EQ(providers[7]["Enabled"], true);
+    // The object that committed last sees the stored state, not only its own changes.
+    EXPECT_EQ(b->GetPort(), 6000);
 }
 
 TEST(Wbem, DeclaredCommands) {
