@@ -41,8 +41,9 @@ void SetHostValues(const BrixTest::TempHost& host,
     host.Import(state);
 }
 
-// A host whose searches wait at most `waitMs` and send multicast on loopback.
-void ShortWaits(const BrixTest::TempHost& host, int waitMs = 400) {
+// A host whose searches wait at most `waitMs` and send multicast on loopback. Searches that get
+// their answer return at once; the wait leaves room for a loaded machine.
+void ShortWaits(const BrixTest::TempHost& host, int waitMs = 1500) {
     SetHostValues(host, {{"slp.ua.multicast_wait_ms", std::to_string(waitMs)},
                          {"slp.ua.unicast_wait_ms", std::to_string(waitMs)},
                          {"slp.ua.interface", "127.0.0.1"}});
@@ -77,7 +78,9 @@ TEST(SlpSearch, UnicastListsServicesWithLifetimes) {
         EXPECT_EQ(run.err, "");
         EXPECT_EQ(json::parse(run.out), kListed) << run.out;
         const auto requests = responder.Requests();
-        ASSERT_EQ(requests.size(), 1u) << c.transport;
+        // Over UDP a slow answer may have been asked for twice, with the same id.
+        ASSERT_FALSE(requests.empty()) << c.transport;
+        EXPECT_EQ(requests.front().xid, requests.back().xid);
         EXPECT_EQ(requests[0].transport, c.transport);
         EXPECT_EQ(requests[0].function, 1);
         EXPECT_EQ(requests[0].flags, 0) << "unicast requests are not marked multicast";
@@ -150,7 +153,7 @@ TEST(SlpSearch, NoAnswerIsAnEmptyTable) {
 
 TEST(SlpSearch, MalformedRepliesAreSkipped) {
     BrixTest::TempHost host;
-    ShortWaits(host, 300);
+    ShortWaits(host, 1000);
     // Over UDP a broken reply and one for another request come first; the answer still counts.
     {
         Responder responder(kServices, Behaviour::MalformedFirst);
@@ -171,7 +174,7 @@ TEST(SlpSearch, MalformedRepliesAreSkipped) {
 
 TEST(SlpSearch, MulticastCollectsAnswers) {
     BrixTest::TempHost host;
-    ShortWaits(host, 400);
+    ShortWaits(host);
     Responder responder(kServices);
     const auto run = Search(host, {"-p", std::to_string(responder.Port()), "-s", "wbem"});
     ASSERT_EQ(run.status, 0) << run.err;
@@ -194,7 +197,7 @@ TEST(SlpSearch, MulticastCollectsAnswers) {
 
 TEST(SlpSearch, ErrorsAndRefusals) {
     BrixTest::TempHost host;
-    ShortWaits(host, 300);
+    ShortWaits(host);
     {
         Responder responder(kServices, Behaviour::Error);
         const auto run =
