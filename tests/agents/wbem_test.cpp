@@ -120,6 +120,7 @@ TEST(Wbem, SetValidationFailsBesideTrueAndCommitsNothing) {
         const char* message;
     };
     const Case cases[] = {
+        {{"set", "-a", "Password", "-e", "true"}, "Invalid --auth value provided\n"},
         {{"set", "-a", "Password", "-e", "false"}, "Invalid --auth value provided\n"},
         {{"set", "-e", "false", "-a", "none", "-p", "80"}, "Invalid --auth value provided\n"},
         {{"set"}, "Specify what to set or --help\n"},
