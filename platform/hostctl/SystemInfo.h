@@ -23,6 +23,8 @@ public:
     std::unique_ptr<Module> GetModule(const std::string& name);
 
     // --- agents ---
+    // The WBEM services' configuration, read when this is called.
+    std::unique_ptr<WbemAgentConfig> GetWbemAgentConfig();
 };
 
 }  // namespace HostCtl::System

@@ -79,6 +79,12 @@
 #include "agents/SnmpAgentTest.h"
 
 // --- agents: slp, wbem ---
+#include "agents/SlpAgentSearch.h"
+#include "agents/SlpAgentStats.h"
+#include "agents/WbemAgentGet.h"
+#include "agents/WbemAgentList.h"
+#include "agents/WbemAgentProviderSet.h"
+#include "agents/WbemAgentSet.h"
 
 using CmdKit::AutoCli::Namespace;
 using CmdKit::AutoCli::NamespaceNode;
@@ -302,8 +308,10 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
     {
         auto slp = MakeNamespace("Commands pertaining to Service Location Protocol (SLP).");
         // --- slp search ---
+        slp->RegisterNamespaceNode(SlpAgentSearch::New(), "search");
         auto stats = MakeNamespace("Get statistics for slpd.");
         // --- slp stats get ---
+        stats->RegisterNamespaceNode(SlpAgentStats::New(), "get");
         slp->RegisterNamespaceNode(stats, "stats");
         system->RegisterNamespaceNode(slp, "slp");
     }
@@ -311,8 +319,12 @@ extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespace
         auto wbem = MakeNamespace(
             "Commands pertaining to WEB Based Enterprise Management (WBEM) Agent configuration.");
         // --- wbem set, get ---
+        wbem->RegisterNamespaceNode(WbemAgentSet::New(), "set");
+        wbem->RegisterNamespaceNode(WbemAgentGet::New(), "get");
         auto provider = MakeNamespace(nullptr);  // deliberately without a description
         // --- wbem provider commands ---
+        provider->RegisterNamespaceNode(WbemAgentList::New(), "list");
+        provider->RegisterNamespaceNode(WbemAgentProviderSet::New(), "set");
         wbem->RegisterNamespaceNode(provider, "provider");
         system->RegisterNamespaceNode(wbem, "wbem");
     }
