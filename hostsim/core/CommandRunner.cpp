@@ -44,7 +44,7 @@ fs::path ProgramDir() {
 int Spawn(const fs::path& program, const std::vector<std::string>& argv, std::string& output) {
     int pipeFds[2];
     if (pipe2(pipeFds, O_CLOEXEC) != 0) {
-        output = argv[0] + ": " + std::strerror(errno) + "\n";
+        output = "Cannot run " + argv[0] + ": " + std::strerror(errno);
         return 126;
     }
     posix_spawn_file_actions_t actions;
@@ -63,7 +63,7 @@ int Spawn(const fs::path& program, const std::vector<std::string>& argv, std::st
     ::close(pipeFds[1]);
     if (error != 0) {
         ::close(pipeFds[0]);
-        output = argv[0] + ": " + std::strerror(error) + "\n";
+        output = "Cannot run " + argv[0] + ": " + std::strerror(error);
         return error == ENOENT ? 127 : 126;
     }
     char buffer[4096];
@@ -89,34 +89,34 @@ int RunHostCommand(const std::vector<std::string>& argv, const std::string& user
                    std::string& output) {
     output.clear();
     if (argv.empty() || argv[0].empty()) {
-        output = "no program given\n";
+        output = "Cannot run: no program given";
         return 127;
     }
     int status = 127;
     try {
         auto& store = BrixSim::Store::Get();
         const std::string& name = argv[0];
-        std::optional<fs::path> real;
-        if (name.front() == '/') real = store.Resolve(name);
+        const fs::path builtin = ProgramDir() / ("brixsim-" + fs::path(name).filename().string());
         if (name.front() != '/') {
-            output = name + ": not an absolute host path\n";
-        } else if (!real) {
-            output = name + ": Permission denied\n";
+            output = "Cannot run " + name + ": not an absolute host path";
+        } else if (const auto real = store.Resolve(name); !real) {
+            output = "Cannot run " + name + ": Permission denied";
             status = 126;
         } else if (IsExecutableFile(*real)) {
             status = Spawn(*real, argv, output);
-        } else if (const fs::path builtin =
-                       ProgramDir() / ("brixsim-" + fs::path(name).filename().string());
-                   !fs::path(name).filename().empty() && IsExecutableFile(builtin)) {
+        } else if (!fs::exists(*real) && !fs::path(name).filename().empty() &&
+                   IsExecutableFile(builtin)) {
             status = Spawn(builtin, argv, output);
         } else {
-            output = name + ": No such file or directory\n";
+            output =
+                "Cannot run " + name + ": " + std::strerror(fs::exists(*real) ? EACCES : ENOENT);
+            status = fs::exists(*real) ? 126 : 127;
         }
         store.Write([&] {
             store.Journal("exec", {{"argv", argv}, {"user", user}, {"status", int64_t{status}}});
         });
     } catch (const std::exception& e) {
-        output += std::string(e.what()) + "\n";
+        output += std::string(e.what());
         if (status == 0) status = 126;
     }
     return status;

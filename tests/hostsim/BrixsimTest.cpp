@@ -1,0 +1,191 @@
+// The brixsim tool: init, faults, export and import, feature switches, usage errors.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+
+#include "core/Store.h"
+#include "support/TestHost.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using BrixSim::Store;
+using BrixTest::TempHost;
+
+TEST(Brixsim, InitRefusesAnExistingHostUnlessForced) {
+    TempHost host;
+    const fs::path root = host.Root() / "fresh";
+    auto first = host.Sim({"--root", root.string(), "init"});
+    ASSERT_EQ(first.status, 0) << first.err;
+    EXPECT_EQ(first.out, "Seeded host at " + root.string() + "\n");
+
+    auto again = host.Sim({"init", "--root", root.string()});
+    EXPECT_EQ(again.status, 1);
+    EXPECT_EQ(again.err, "brixsim: a host already exists at " + root.string() +
+                             "; use init --force to recreate it\n");
+
+    ASSERT_EQ(host.Sim({"--root", root.string(), "feature", "set", "7", "on"}).status, 0);
+    fs::create_directories(root / "etc/ostrel");
+    auto forced = host.Sim({"--root", root.string(), "init", "--force"});
+    ASSERT_EQ(forced.status, 0) << forced.err;
+    EXPECT_FALSE(fs::exists(root / "etc"));
+    EXPECT_EQ(host.Sim({"--root", root.string(), "feature", "get", "7"}).out, "off\n");
+}
+
+TEST(Brixsim, FaultsAreArmedCountedAndCleared) {
+    TempHost host;
+    const std::string op = "HostCtl::HostFactory::GetHost";
+    ASSERT_EQ(host.Sim({"fault", "set", op, "No host", "--times", "3", "--detail", "d"}).status, 0);
+    ASSERT_EQ(host.Sim({"fault", "set", "KernCtl::Util::Sysinfo::List", "Down"}).status, 0);
+    EXPECT_EQ(host.Sim({"fault", "list"}).out,
+              "{\"op\":\"HostCtl::HostFactory::GetHost\",\"message\":\"No host\",\"detail\":\"d\","
+              "\"remaining\":3}\n"
+              "{\"op\":\"KernCtl::Util::Sysinfo::List\",\"message\":\"Down\",\"detail\":null,"
+              "\"remaining\":null}\n");
+    // Arming again replaces the fault.
+    ASSERT_EQ(host.Sim({"fault", "set", op, "Gone"}).status, 0);
+    EXPECT_THROW(Store::Get().Check(op), std::exception);
+    EXPECT_THROW(Store::Get().Check(op), std::exception);  // until cleared
+    ASSERT_EQ(host.Sim({"fault", "clear", op}).status, 0);
+    EXPECT_NO_THROW(Store::Get().Check(op));
+    EXPECT_THROW(Store::Get().Check("KernCtl::Util::Sysinfo::List"), std::exception);
+    ASSERT_EQ(host.Sim({"fault", "clear"}).status, 0);
+    EXPECT_EQ(host.Sim({"fault", "list"}).out, "");
+    // Faults arm nothing in the journal.
+    EXPECT_TRUE(host.Journal().empty());
+}
+
+TEST(Brixsim, FaultOpsListsRegisteredOperationsSorted) {
+    TempHost host;
+    const auto result = host.Sim({"fault", "ops"});
+    ASSERT_EQ(result.status, 0);
+    std::vector<std::string> ops;
+    std::istringstream lines(result.out);
+    for (std::string line; std::getline(lines, line);) ops.push_back(line);
+    EXPECT_TRUE(std::is_sorted(ops.begin(), ops.end()));
+    EXPECT_EQ(std::adjacent_find(ops.begin(), ops.end()), ops.end());
+    for (const char* op : {"HostCtl::HostFactory::GetHost", "KernCtl::Util::Sysinfo::Get",
+                           "KernCtl::Util::Sysinfo::List"}) {
+        EXPECT_NE(std::find(ops.begin(), ops.end(), op), ops.end()) << op;
+    }
+}
+
+TEST(Brixsim, WrongInvocationsExitTwoWithUsage) {
+    TempHost host;
+    const std::vector<std::vector<std::string>> wrong = {
+        {},
+        {"frobnicate"},
+        {"fault"},
+        {"fault", "set", "HostCtl::HostFactory::GetHost"},
+        {"fault", "set", "HostCtl::HostFactory::GetHost", "m", "--times", "0"},
+        {"fault", "set", "HostCtl::HostFactory::GetHost", "m", "--times", "two"},
+        {"fault", "set", "HostCtl::HostFactory::GetHost", "m", "--bogus"},
+        {"feature", "set", "256", "on"},
+        {"feature", "set", "120", "maybe"},
+        {"feature", "get"},
+        {"import"},
+        {"export", "extra"},
+        {"journal", "--all"},
+    };
+    for (const auto& args : wrong) {
+        const auto result = host.Sim(args);
+        EXPECT_EQ(result.status, 2) << testing::PrintToString(args);
+        EXPECT_NE(result.err.find("Usage: brixsim"), std::string::npos);
+        EXPECT_EQ(result.out, "");
+    }
+    const auto unknown = host.Sim({"fault", "set", "No::Such::Op", "m"});
+    EXPECT_EQ(unknown.status, 1);
+    EXPECT_EQ(unknown.err,
+              "brixsim: unknown operation No::Such::Op (brixsim fault ops lists them)\n");
+    EXPECT_EQ(host.Sim({"--help"}).status, 0);
+}
+
+TEST(Brixsim, ExportImportRoundTrip) {
+    TempHost host;
+    Store::Get().SetValue("system.hostname", "brix-07");
+    Store::Get().Journal("sleep", {{"seconds", int64_t{1}}});
+    ASSERT_EQ(host.Sim({"feature", "set", "120", "on"}).status, 0);
+    const auto before = host.Export();
+    EXPECT_EQ(before["version"], 1);
+    EXPECT_FALSE(before["tables"].contains("meta"));
+    ASSERT_TRUE(before["tables"].contains("host"));
+    ASSERT_TRUE(before["tables"].contains("journal"));
+
+    // Change things, then bring the exported state back.
+    Store::Get().SetValue("system.hostname", "other");
+    Store::Get().SetValue("extra.key", "x");
+    ASSERT_EQ(host.Sim({"feature", "set", "120", "off"}).status, 0);
+    host.Import(before);
+    EXPECT_EQ(host.Export(), before);
+    EXPECT_EQ(Store::Get().GetValue("system.hostname", ""), "brix-07");
+    EXPECT_FALSE(Store::Get().GetValue("extra.key").has_value());
+
+    // The same document into a brand-new host gives the same state.
+    TempHost other;
+    other.Import(before);
+    EXPECT_EQ(other.Export(), before);
+}
+
+TEST(Brixsim, ImportReplacesOnlyTheTablesGiven) {
+    TempHost host;
+    Store::Get().SetValue("kept", "yes");
+    host.Import({{"features", {{{"entry", 120}, {"state", true}}}}});
+    EXPECT_EQ(host.Sim({"feature", "get", "120"}).out, "on\n");
+    EXPECT_EQ(host.Sim({"feature", "get", "0"}).out, "off\n");
+    EXPECT_EQ(host.Export()["tables"]["features"].size(), 1u);
+    EXPECT_EQ(Store::Get().GetValue("kept", ""), "yes");
+}
+
+TEST(Brixsim, BadImportsChangeNothing) {
+    TempHost host;
+    Store::Get().SetValue("kept", "yes");
+    const auto before = host.Export();
+    const fs::path file = host.Root() / "state.json";
+    struct Case {
+        std::string document;
+        std::string error;
+    };
+    const Case cases[] = {
+        {R"({"version":1,"tables":{"host":[],"nosuch":[]}})", "unknown table \"nosuch\""},
+        {R"({"version":1,"tables":{"host":[{"key":"a","value":"b","colour":"red"}]}})",
+         "table \"host\" row 0: unknown column \"colour\""},
+        {R"({"version":1,"tables":{"meta":[]}})", "unknown table \"meta\""},
+        {R"({"version":2,"tables":{}})", "\"version\" must be 1"},
+        {R"({"version":1,"tables":{"host":{}}})", "table \"host\" is not an array of rows"},
+        {R"({"version":1,"tables":{"host":[{"key":"a","value":[1]}]}})",
+         "table \"host\" row 0 column \"value\": not a scalar value"},
+        // Rows that break a constraint fail in the middle of the transaction.
+        {R"({"version":1,"tables":{"host":[{"key":"a","value":"1"},{"key":"a","value":"2"}]}})",
+         "UNIQUE constraint failed: host.key"},
+        {R"({"version":1,"tables":{"features":[{"entry":300,"state":1}]}})",
+         "CHECK constraint failed"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.document);
+        std::ofstream(file, std::ios::trunc) << c.document;
+        const auto result = host.Sim({"import", file.string()});
+        EXPECT_EQ(result.status, 1);
+        EXPECT_EQ(result.err.rfind("brixsim: import refused, nothing changed: ", 0), 0u)
+            << result.err;
+        EXPECT_NE(result.err.find(c.error), std::string::npos) << result.err;
+        EXPECT_EQ(host.Export(), before);
+    }
+    std::ofstream(file, std::ios::trunc) << "{not json";
+    EXPECT_EQ(host.Sim({"import", file.string()}).status, 1);
+    EXPECT_EQ(host.Sim({"import", (host.Root() / "missing.json").string()}).status, 1);
+    EXPECT_EQ(host.Export(), before);
+}
+
+TEST(Brixsim, ImportReadsStandardInput) {
+    TempHost host;
+    const auto result =
+        BrixTest::Run({BRIX_BIN_DIR "/brixsim", "import", "-"},
+                      R"({"version":1,"tables":{"host":[{"key":"from","value":"stdin"}]}})");
+    ASSERT_EQ(result.status, 0) << result.err;
+    EXPECT_EQ(Store::Get().GetValue("from", ""), "stdin");
+}
+
+}  // namespace
