@@ -20,6 +20,7 @@ public:
 
     std::unique_ptr<System::SystemInfo> GetSystemInfo();
     // --- network ---
+    std::unique_ptr<Network::NetworkInfo> GetNetworkInfo();
 };
 
 namespace HostFactory {

@@ -19,8 +19,12 @@ public:
     std::string GetInceptionTime();
 
     // --- modules ---
+    // The module object for a name; its operations check the name.
+    std::unique_ptr<Module> GetModule(const std::string& name);
 
     // --- agents ---
+    // The WBEM services' configuration, read when this is called.
+    std::unique_ptr<WbemAgentConfig> GetWbemAgentConfig();
 };
 
 }  // namespace HostCtl::System

@@ -9,6 +9,14 @@
 // Node identifiers published by the kernel.
 constexpr uint16_t KSI_NODE_system_version = 0x0101;
 // --- memory file system nodes ---
+constexpr uint16_t KSI_NODE_system_quillfs_stats = 0x0701;
+constexpr uint16_t KSI_NODE_system_quillfs_ramdisks = 0x0702;
+constexpr uint16_t KSI_NODE_system_quillfs_ramdisks_stats = 0x0703;
+constexpr uint16_t KSI_NODE_system_quillfs_tardisks = 0x0704;
+constexpr uint16_t KSI_NODE_system_quillfs_tardisks_stats = 0x0705;
+// User-level worlds: instance names are world ids in decimal.
+constexpr uint16_t KSI_NODE_system_worlds = 0x0601;
+constexpr uint16_t KSI_NODE_system_worlds_info = 0x0602;
 
 namespace KernCtl::Util {
 

@@ -55,7 +55,9 @@ TEST(Registration, OddPlacementsAndEmptyDescription) {
 TEST(Registration, DornaFollowsFeature120) {
     for (bool on : {false, true}) {
         BrixTest::TempHost host;
-        if (on) ASSERT_EQ(host.Sim({"feature", "set", "120", "on"}).status, 0);
+        if (on) {
+            ASSERT_EQ(host.Sim({"feature", "set", "120", "on"}).status, 0);
+        }
         auto coredump = Node(Register(), {"system", "coredump"});
         ASSERT_TRUE(coredump);
         std::vector<std::string> expected{"partition", "network", "file"};

@@ -1,0 +1,563 @@
+// The output formatters: simple, table, json, xml, csv and keyvalue.
+#include <algorithm>
+#include <boost/algorithm/string/trim.hpp>
+#include <nlohmann/json.hpp>
+#include <ostream>
+#include <pugixml.hpp>
+#include <sstream>
+
+#include "Internal.h"
+
+namespace CmdKit::Detail {
+
+namespace {
+
+using MetaObj::MetaBool;
+using MetaObj::MetaInt;
+using MetaObj::MetaList;
+using MetaObj::MetaObject;
+using MetaObj::MetaString;
+using MetaObj::MetaStruct;
+
+const MetaStruct* AsStruct(const MetaObject* object) {
+    return object && object->GetMetaType() == MetaObj::META_STRUCT
+               ? static_cast<const MetaStruct*>(object)
+               : nullptr;
+}
+
+const MetaList* AsList(const MetaObject* object) {
+    return object && object->GetMetaType() == MetaObj::META_LIST
+               ? static_cast<const MetaList*>(object)
+               : nullptr;
+}
+
+std::string Hint(const Hints& hints, const std::string& key) {
+    auto found = hints.find(key);
+    return found == hints.end() ? std::string() : found->second;
+}
+
+std::vector<std::string> SplitNames(const std::string& text) {
+    std::vector<std::string> names;
+    std::stringstream stream(text);
+    std::string name;
+    while (std::getline(stream, name, ',')) {
+        boost::algorithm::trim(name);
+        if (!name.empty()) names.push_back(name);
+    }
+    return names;
+}
+
+// The prototype of a list's elements: the list's own, else the one the declared result gives.
+const MetaStruct* ElementPrototype(const MetaList& list, const MetaObject* prototype) {
+    if (list.GetPrototype()) return list.GetPrototype().get();
+    if (const MetaList* declared = AsList(prototype)) return declared->GetPrototype().get();
+    return nullptr;
+}
+
+// Every field of `object` in the declared structure's order, then any field it does not
+// declare in the object's own order.
+std::vector<const MetaStruct::Field*> AllFields(const MetaStruct& object,
+                                                const MetaStruct* prototype) {
+    std::vector<const MetaStruct::Field*> fields;
+    fields.reserve(object.GetFields().size());
+    if (prototype) {
+        for (const auto& declared : prototype->GetFields()) {
+            for (const auto& field : object.GetFields()) {
+                if (field.name == declared.name) fields.push_back(&field);
+            }
+        }
+    }
+    for (const auto& field : object.GetFields()) {
+        if (std::find(fields.begin(), fields.end(), &field) == fields.end()) {
+            fields.push_back(&field);
+        }
+    }
+    return fields;
+}
+
+const MetaObject* DeclaredField(const MetaStruct* prototype, const std::string& name) {
+    return prototype ? prototype->GetField(name).get() : nullptr;
+}
+
+// The names of the fields to show of a structure: the "fields:<Struct>" hint when set,
+// otherwise all fields.
+std::vector<std::string> ShownFields(const MetaStruct& object, const MetaStruct* prototype,
+                                     const Hints& hints) {
+    std::vector<std::string> names;
+    const std::string hint = Hint(hints, "fields:" + object.GetName());
+    if (!hint.empty()) {
+        for (auto& name : SplitNames(hint)) {
+            if (object.GetField(name) || DeclaredField(prototype, name)) names.push_back(name);
+        }
+        return names;
+    }
+    for (const auto* field : AllFields(object, prototype)) names.push_back(field->name);
+    return names;
+}
+
+std::string IntText(const MetaInt& value) {
+    return value.HasValue() ? std::to_string(value.GetValue()) : std::string();
+}
+
+// A value as one piece of text: scalars as themselves, a list's elements comma-separated,
+// a structure as its "Field: value" pairs.
+std::string InlineText(const MetaObject* object) {
+    if (!object) return std::string();
+    switch (object->GetMetaType()) {
+        case MetaObj::META_STRING:
+            return static_cast<const MetaString*>(object)->GetValue();
+        case MetaObj::META_INT:
+            return IntText(*static_cast<const MetaInt*>(object));
+        case MetaObj::META_BOOL:
+            return static_cast<const MetaBool*>(object)->GetValue() ? "true" : "false";
+        case MetaObj::META_LIST: {
+            std::string text;
+            for (const auto& element : static_cast<const MetaList*>(object)->GetElements()) {
+                if (!text.empty()) text += ", ";
+                text += InlineText(element.get());
+            }
+            return text;
+        }
+        case MetaObj::META_STRUCT: {
+            std::string text;
+            for (const auto& field : static_cast<const MetaStruct*>(object)->GetFields()) {
+                if (!text.empty()) text += ", ";
+                text += field.name + ": " + InlineText(field.value.get());
+            }
+            return text;
+        }
+    }
+    return std::string();
+}
+
+std::string WithUnit(const std::string& text, const Hints& hints, const std::string& structName,
+                     const std::string& field) {
+    const std::string unit = Hint(hints, "units:" + structName + "." + field);
+    if (unit.empty() || text.empty()) return text;
+    return text + " " + unit;
+}
+
+// --- simple ---
+
+void SimpleStruct(const MetaStruct& object, const MetaStruct* prototype, const Hints& hints,
+                  size_t indent, bool nested, std::ostream& out);
+
+void SimpleField(const std::string& name, const MetaObject* value, const MetaObject* declared,
+                 const std::string& structName, const Hints& hints, size_t indent,
+                 std::ostream& out) {
+    const std::string pad(indent, ' ');
+    if (const MetaStruct* inner = AsStruct(value)) {
+        out << pad << name << ":\n";
+        SimpleStruct(*inner, AsStruct(declared), hints, indent + 3, true, out);
+        return;
+    }
+    const MetaList* list = AsList(value);
+    if (list && list->GetElementType() == MetaObj::META_STRUCT) {
+        out << pad << name << ":\n";
+        const MetaStruct* elementPrototype = ElementPrototype(*list, declared);
+        for (const auto& element : list->GetElements()) {
+            SimpleStruct(static_cast<const MetaStruct&>(*element), elementPrototype, hints,
+                         indent + 3, false, out);
+        }
+        return;
+    }
+    const std::string text = WithUnit(InlineText(value), hints, structName, name);
+    out << pad << name << ":";
+    if (!text.empty()) out << ' ' << text;
+    out << '\n';
+}
+
+void SimpleStruct(const MetaStruct& object, const MetaStruct* prototype, const Hints& hints,
+                  size_t indent, bool nested, std::ostream& out) {
+    const bool header = !nested && Hint(hints, "show-header:" + object.GetName()) != "false";
+    size_t fieldIndent = indent;
+    if (header) {
+        out << std::string(indent, ' ') << object.GetName() << ":\n";
+        fieldIndent += 3;
+    }
+    for (const auto& name : ShownFields(object, prototype, hints)) {
+        SimpleField(name, object.GetField(name).get(), DeclaredField(prototype, name),
+                    object.GetName(), hints, fieldIndent, out);
+    }
+}
+
+void FormatSimple(const MetaObject& result, const FormatContext& context, std::ostream& out) {
+    if (const MetaStruct* object = AsStruct(&result)) {
+        SimpleStruct(*object, AsStruct(context.prototype.get()), context.hints, 0, false, out);
+        return;
+    }
+    if (const MetaList* list = AsList(&result)) {
+        const MetaStruct* prototype = ElementPrototype(*list, context.prototype.get());
+        bool first = true;
+        for (const auto& element : list->GetElements()) {
+            if (const MetaStruct* row = AsStruct(element.get())) {
+                if (!first) out << '\n';
+                SimpleStruct(*row, prototype, context.hints, 0, false, out);
+            } else {
+                out << InlineText(element.get()) << '\n';
+            }
+            first = false;
+        }
+        return;
+    }
+    out << InlineText(&result) << '\n';
+}
+
+// --- table ---
+
+std::string OneLine(std::string text) {
+    std::replace(text.begin(), text.end(), '\n', ' ');
+    std::replace(text.begin(), text.end(), '\r', ' ');
+    std::replace(text.begin(), text.end(), '\t', ' ');
+    return text;
+}
+
+// Splits a cell into pieces of at most `width` characters, at spaces where possible.
+std::vector<std::string> WrapCell(const std::string& text, size_t width) {
+    std::vector<std::string> pieces;
+    std::string rest = text;
+    while (rest.size() > width) {
+        size_t cut = rest.rfind(' ', width);
+        if (cut == std::string::npos || cut == 0) {
+            pieces.push_back(rest.substr(0, width));
+            rest.erase(0, width);
+        } else {
+            pieces.push_back(rest.substr(0, cut));
+            rest.erase(0, cut + 1);
+        }
+    }
+    pieces.push_back(rest);
+    return pieces;
+}
+
+void WriteLine(std::string line, size_t cut, std::ostream& out) {
+    boost::algorithm::trim_right(line);
+    if (cut > 0 && line.size() > cut) line.resize(cut);
+    out << line << '\n';
+}
+
+void FormatTable(const MetaList& list, const FormatContext& context, std::ostream& out) {
+    const MetaStruct* prototype = ElementPrototype(list, context.prototype.get());
+    const MetaStruct* first =
+        list.GetElements().empty() ? nullptr : AsStruct(list.GetElements().front().get());
+    // A prototype without fields (only a name) leaves the columns to the first row.
+    const MetaStruct* shape = prototype && !prototype->GetFields().empty() ? prototype : first;
+    if (!shape) shape = prototype;
+    const std::string structName = shape ? shape->GetName() : std::string();
+
+    std::vector<std::string> columns = SplitNames(Hint(context.hints, "table-columns"));
+    if (columns.empty()) columns = SplitNames(Hint(context.hints, "fields:" + structName));
+    if (columns.empty() && shape) {
+        for (const auto& field : shape->GetFields()) columns.push_back(field.name);
+    }
+
+    std::vector<std::vector<std::string>> rows;
+    std::vector<std::string> header;
+    for (const auto& column : columns) {
+        const std::string unit = Hint(context.hints, "units:" + structName + "." + column);
+        header.push_back(unit.empty() ? column : column + " (" + unit + ")");
+    }
+    rows.reserve(list.Size());
+    for (const auto& element : list.GetElements()) {
+        const MetaStruct* row = AsStruct(element.get());
+        std::vector<std::string> cells;
+        cells.reserve(columns.size());
+        for (const auto& column : columns) {
+            cells.push_back(row ? OneLine(InlineText(row->GetField(column).get())) : "");
+        }
+        rows.push_back(std::move(cells));
+    }
+
+    std::vector<size_t> widths;
+    for (const auto& title : header) widths.push_back(title.size());
+    for (const auto& row : rows) {
+        for (size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
+    }
+    if (columns.empty()) return;
+
+    // Where the last column starts, and how much room a terminal leaves it.
+    size_t lastStart = 0;
+    for (size_t i = 0; i + 1 < widths.size(); ++i) lastStart += widths[i] + 2;
+    const size_t terminal = context.terminalWidth;
+    const bool tooWide = terminal > 0 && lastStart + widths.back() > terminal;
+    const bool wrap =
+        tooWide && Hint(context.hints, "wrap-last") == "true" && terminal > lastStart + 10;
+    const size_t cut = tooWide && !wrap ? terminal : 0;
+
+    auto writeRow = [&](const std::vector<std::string>& cells) {
+        std::string line;
+        for (size_t i = 0; i + 1 < cells.size(); ++i) {
+            line += cells[i];
+            line.append(widths[i] - cells[i].size() + 2, ' ');
+        }
+        if (!wrap) {
+            WriteLine(line + cells.back(), cut, out);
+            return;
+        }
+        auto pieces = WrapCell(cells.back(), terminal - lastStart);
+        WriteLine(line + pieces[0], 0, out);
+        for (size_t i = 1; i < pieces.size(); ++i) {
+            WriteLine(std::string(lastStart, ' ') + pieces[i], 0, out);
+        }
+    };
+    writeRow(header);
+    std::vector<std::string> dashes;
+    for (size_t i = 0; i < widths.size(); ++i) {
+        // The dashes under the last column stop where the terminal does.
+        size_t width = widths[i];
+        if (wrap && i + 1 == widths.size()) width = std::min(width, terminal - lastStart);
+        dashes.push_back(std::string(width, '-'));
+    }
+    writeRow(dashes);
+    for (const auto& row : rows) writeRow(row);
+}
+
+// --- json ---
+
+using Json = nlohmann::ordered_json;
+
+Json ToJson(const MetaObject* object, const MetaObject* prototype) {
+    if (!object) return nullptr;
+    switch (object->GetMetaType()) {
+        case MetaObj::META_STRING:
+            return static_cast<const MetaString*>(object)->GetValue();
+        case MetaObj::META_INT: {
+            const auto* value = static_cast<const MetaInt*>(object);
+            if (!value->HasValue()) return nullptr;
+            return static_cast<int64_t>(value->GetValue());
+        }
+        case MetaObj::META_BOOL:
+            return static_cast<const MetaBool*>(object)->GetValue();
+        case MetaObj::META_LIST: {
+            const auto* list = static_cast<const MetaList*>(object);
+            const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
+            Json array = Json::array();
+            for (const auto& element : list->GetElements()) {
+                array.push_back(ToJson(element.get(), elementPrototype));
+            }
+            return array;
+        }
+        case MetaObj::META_STRUCT: {
+            const auto* structure = static_cast<const MetaStruct*>(object);
+            const MetaStruct* declared = AsStruct(prototype);
+            Json json = Json::object();
+            for (const auto* field : AllFields(*structure, declared)) {
+                json[field->name] =
+                    ToJson(field->value.get(), DeclaredField(declared, field->name));
+            }
+            return json;
+        }
+    }
+    return nullptr;
+}
+
+// --- xml ---
+
+void ToXml(const MetaObject* object, const MetaObject* prototype, pugi::xml_node parent) {
+    if (!object) {
+        parent.append_child("null");
+        return;
+    }
+    switch (object->GetMetaType()) {
+        case MetaObj::META_STRING:
+            parent.append_child("string").text().set(
+                static_cast<const MetaString*>(object)->GetValue().c_str());
+            return;
+        case MetaObj::META_INT: {
+            auto node = parent.append_child("integer");
+            const auto* value = static_cast<const MetaInt*>(object);
+            if (value->HasValue()) node.text().set(std::to_string(value->GetValue()).c_str());
+            return;
+        }
+        case MetaObj::META_BOOL:
+            parent.append_child("boolean").text().set(
+                static_cast<const MetaBool*>(object)->GetValue() ? "true" : "false");
+            return;
+        case MetaObj::META_LIST: {
+            const auto* list = static_cast<const MetaList*>(object);
+            auto node = parent.append_child("list");
+            node.append_attribute("type") =
+                list->GetElementType() == MetaObj::META_STRUCT ? "structure" : "string";
+            const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
+            for (const auto& element : list->GetElements()) {
+                ToXml(element.get(), elementPrototype, node);
+            }
+            return;
+        }
+        case MetaObj::META_STRUCT: {
+            const auto* structure = static_cast<const MetaStruct*>(object);
+            const MetaStruct* declared = AsStruct(prototype);
+            auto node = parent.append_child("structure");
+            node.append_attribute("typeName") = structure->GetName().c_str();
+            for (const auto* field : AllFields(*structure, declared)) {
+                auto fieldNode = node.append_child("field");
+                fieldNode.append_attribute("name") = field->name.c_str();
+                ToXml(field->value.get(), DeclaredField(declared, field->name), fieldNode);
+            }
+            return;
+        }
+    }
+}
+
+// --- csv ---
+
+std::string CsvCell(const std::string& text) {
+    if (text.find_first_of(",\"\r\n") == std::string::npos) return text;
+    std::string quoted = "\"";
+    for (char c : text) {
+        if (c == '"') quoted += '"';
+        quoted += c;
+    }
+    return quoted + "\"";
+}
+
+void CsvRows(const std::vector<const MetaStruct*>& rows, const MetaStruct* prototype,
+             std::ostream& out) {
+    std::vector<std::string> columns;
+    if (prototype) {
+        for (const auto& field : prototype->GetFields()) columns.push_back(field.name);
+    }
+    for (const auto* row : rows) {
+        for (const auto& field : row->GetFields()) {
+            if (std::find(columns.begin(), columns.end(), field.name) == columns.end()) {
+                columns.push_back(field.name);
+            }
+        }
+    }
+    if (columns.empty()) return;
+    auto writeLine = [&](const std::vector<std::string>& cells) {
+        for (size_t i = 0; i < cells.size(); ++i) out << (i ? "," : "") << CsvCell(cells[i]);
+        out << '\n';
+    };
+    writeLine(columns);
+    for (const auto* row : rows) {
+        std::vector<std::string> cells;
+        for (const auto& column : columns) cells.push_back(InlineText(row->GetField(column).get()));
+        writeLine(cells);
+    }
+}
+
+void FormatCsv(const MetaObject& result, const FormatContext& context, std::ostream& out) {
+    if (const MetaStruct* object = AsStruct(&result)) {
+        const MetaStruct* declared = AsStruct(context.prototype.get());
+        CsvRows({object}, declared ? declared : object, out);
+        return;
+    }
+    if (const MetaList* list = AsList(&result)) {
+        if (list->GetElementType() == MetaObj::META_STRUCT) {
+            std::vector<const MetaStruct*> rows;
+            for (const auto& element : list->GetElements()) {
+                if (const MetaStruct* row = AsStruct(element.get())) rows.push_back(row);
+            }
+            CsvRows(rows, ElementPrototype(*list, context.prototype.get()), out);
+            return;
+        }
+        for (const auto& element : list->GetElements()) {
+            out << CsvCell(InlineText(element.get())) << '\n';
+        }
+        return;
+    }
+    out << CsvCell(InlineText(&result)) << '\n';
+}
+
+// --- keyvalue ---
+
+std::string Escape(const std::string& text) {
+    std::string escaped;
+    escaped.reserve(text.size());
+    for (char c : text) {
+        if (c == '\\') {
+            escaped += "\\\\";
+        } else if (c == '\n') {
+            escaped += "\\n";
+        } else {
+            escaped += c;
+        }
+    }
+    return escaped;
+}
+
+void KeyValue(const std::string& key, const MetaObject* object, const MetaObject* prototype,
+              std::ostream& out) {
+    if (const MetaStruct* structure = AsStruct(object)) {
+        const MetaStruct* declared = AsStruct(prototype);
+        for (const auto* field : AllFields(*structure, declared)) {
+            KeyValue(key + "." + field->name, field->value.get(),
+                     DeclaredField(declared, field->name), out);
+        }
+        return;
+    }
+    if (const MetaList* list = AsList(object)) {
+        if (list->GetElements().empty()) {
+            out << key << "=\n";
+            return;
+        }
+        const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
+        for (size_t i = 0; i < list->Size(); ++i) {
+            KeyValue(key + "[" + std::to_string(i) + "]", list->GetElements()[i].get(),
+                     elementPrototype, out);
+        }
+        return;
+    }
+    out << key << '=' << Escape(InlineText(object)) << '\n';
+}
+
+void FormatKeyValue(const MetaObject& result, const FormatContext& context, std::ostream& out) {
+    const MetaObject* prototype = context.prototype.get();
+    switch (result.GetMetaType()) {
+        case MetaObj::META_STRUCT:
+            KeyValue(static_cast<const MetaStruct&>(result).GetName(), &result, prototype, out);
+            return;
+        case MetaObj::META_LIST: {
+            const auto& list = static_cast<const MetaList&>(result);
+            const MetaStruct* elementPrototype = ElementPrototype(list, prototype);
+            for (size_t i = 0; i < list.Size(); ++i) {
+                const MetaObject* element = list.GetElements()[i].get();
+                const MetaStruct* row = AsStruct(element);
+                const std::string name = row ? row->GetName() : std::string("String");
+                KeyValue(name + "[" + std::to_string(i) + "]", element, elementPrototype, out);
+            }
+            return;
+        }
+        case MetaObj::META_STRING:
+            KeyValue("String", &result, nullptr, out);
+            return;
+        case MetaObj::META_INT:
+            KeyValue("Integer", &result, nullptr, out);
+            return;
+        case MetaObj::META_BOOL:
+            KeyValue("Boolean", &result, nullptr, out);
+            return;
+    }
+}
+
+}  // namespace
+
+bool IsFormatterName(const std::string& name) {
+    return name == "simple" || name == "table" || name == "json" || name == "xml" ||
+           name == "csv" || name == "keyvalue";
+}
+
+void Format(const std::string& formatter, const MetaObj::MetaObject& result,
+            const FormatContext& context, std::ostream& out) {
+    if (formatter == "json") {
+        out << ToJson(&result, context.prototype.get())
+                   .dump(2, ' ', false, nlohmann::json::error_handler_t::replace)
+            << '\n';
+    } else if (formatter == "xml") {
+        pugi::xml_document document;
+        ToXml(&result, context.prototype.get(), document.append_child("output"));
+        document.save(out, "  ", pugi::format_default, pugi::encoding_utf8);
+    } else if (formatter == "csv") {
+        FormatCsv(result, context, out);
+    } else if (formatter == "keyvalue") {
+        FormatKeyValue(result, context, out);
+    } else if (formatter == "table" && AsList(&result) &&
+               AsList(&result)->GetElementType() == MetaObj::META_STRUCT) {
+        FormatTable(*AsList(&result), context, out);
+    } else {
+        FormatSimple(result, context, out);
+    }
+}
+
+}  // namespace CmdKit::Detail

@@ -1,0 +1,196 @@
+// Help of namespaces and commands.
+#include <algorithm>
+#include <ostream>
+
+#include "Internal.h"
+
+namespace CmdKit::Detail {
+
+namespace {
+
+using AutoCli::CommandSpec;
+using AutoCli::NamespaceNode;
+using AutoCli::NodeType;
+
+constexpr size_t kWidth = 100;
+
+std::string TypeName(int type) {
+    switch (type) {
+        case CallSpec::PARAM_STRING:
+            return "str";
+        case CallSpec::PARAM_INT:
+            return "long";
+        case CallSpec::PARAM_BOOL:
+            return "bool";
+        case CallSpec::PARAM_FLAG:
+            return "flag";
+        case CallSpec::PARAM_STRING_LIST:
+            return "str[]";
+        default:
+            return "?";
+    }
+}
+
+void ReplaceAll(std::string& text, const std::string& from, const std::string& to) {
+    for (size_t at = text.find(from); at != std::string::npos;
+         at = text.find(from, at + to.size())) {
+        text.replace(at, from.size(), to);
+    }
+}
+
+// Breaks `text` into lines of at most `width` characters at spaces; explicit line breaks stay.
+std::vector<std::string> Wrap(const std::string& text, size_t width) {
+    std::vector<std::string> lines;
+    size_t start = 0;
+    while (start <= text.size()) {
+        size_t end = text.find('\n', start);
+        if (end == std::string::npos) end = text.size();
+        std::string paragraph = text.substr(start, end - start);
+        while (paragraph.size() > width) {
+            size_t cut = paragraph.rfind(' ', width);
+            if (cut == std::string::npos || cut == 0) cut = paragraph.find(' ', width);
+            if (cut == std::string::npos) break;
+            lines.push_back(paragraph.substr(0, cut));
+            paragraph.erase(0, cut + 1);
+        }
+        lines.push_back(paragraph);
+        start = end + 1;
+    }
+    return lines;
+}
+
+void PrintIndented(std::ostream& out, const std::string& text, size_t indent) {
+    for (const auto& line : Wrap(text, kWidth - indent)) {
+        out << std::string(line.empty() ? 0 : indent, ' ') << line << '\n';
+    }
+}
+
+std::string Usage(const NamespaceNode& node) {
+    std::string path = node.GetPathString(' ');
+    std::string usage = "Usage: brixcli [--formatter=simple|table|json|xml|csv|keyvalue]";
+    if (!path.empty()) usage += " " + path;
+    if (node.GetType() == NodeType::Command) return usage + " [cmd options]";
+    return usage + " {cmd} [cmd options]";
+}
+
+// The parameter's description with "%ENUM%" and "%FULLENUM%" filled in, then its constraint
+// where the description did not already show it, then the required marker.
+std::string ParameterText(const CallSpec::ParameterSpec& parameter) {
+    std::string text = parameter.GetDescription();
+    const auto& constraint = parameter.GetConstraint();
+    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
+        std::string values;
+        std::string full;
+        for (const auto& entry : constraint->GetEnumValues()) {
+            if (!values.empty()) values += ", ";
+            values += entry.value;
+            full += "\n  " + entry.value;
+            if (!entry.description.empty()) full += ": " + entry.description;
+        }
+        const bool shown = text.find("%ENUM%") != std::string::npos ||
+                           text.find("%FULLENUM%") != std::string::npos;
+        ReplaceAll(text, "%FULLENUM%", full);
+        ReplaceAll(text, "%ENUM%", values);
+        if (!shown) text += (text.empty() ? "" : " ") + std::string("(one of: ") + values + ")";
+    } else {
+        ReplaceAll(text, "%FULLENUM%", "");
+        ReplaceAll(text, "%ENUM%", "");
+    }
+    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_INT_RANGE) {
+        std::string range;
+        if (constraint->GetMin() == INT64_MIN && constraint->GetMax() != INT64_MAX) {
+            range = "at most " + std::to_string(constraint->GetMax());
+        } else if (constraint->GetMin() != INT64_MIN && constraint->GetMax() == INT64_MAX) {
+            range = "at least " + std::to_string(constraint->GetMin());
+        } else if (constraint->GetMin() != INT64_MIN) {
+            range =
+                std::to_string(constraint->GetMin()) + ".." + std::to_string(constraint->GetMax());
+        }
+        if (!range.empty())
+            text += (text.empty() ? "" : " ") + std::string("(range ") + range + ")";
+    }
+    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_REGEX) {
+        text +=
+            (text.empty() ? "" : " ") + std::string("(must match ") + constraint->GetRegex() + ")";
+    }
+    if (parameter.GetType() == CallSpec::PARAM_STRING_LIST) {
+        text += (text.empty() ? "" : " ") + std::string("(may be repeated)");
+    }
+    if (parameter.IsRequired()) text += (text.empty() ? "" : " ") + std::string("(required)");
+    return text;
+}
+
+std::string OptionSynopsis(const CallSpec::ParameterSpec& parameter) {
+    std::string synopsis;
+    if (!parameter.GetShortName().empty()) synopsis = "-" + parameter.GetShortName() + "|";
+    synopsis += "--" + parameter.GetName();
+    if (parameter.GetType() != CallSpec::PARAM_FLAG) {
+        synopsis += "=<" + TypeName(parameter.GetType()) + ">";
+    }
+    return synopsis;
+}
+
+// Rows of two columns: the left column padded, the right one wrapped beside it.
+void PrintColumns(std::ostream& out, const std::vector<std::pair<std::string, std::string>>& rows) {
+    size_t left = 0;
+    for (const auto& row : rows) left = std::max(left, row.first.size());
+    const size_t indent = 2 + left + 2;
+    const size_t width = kWidth > indent + 20 ? kWidth - indent : 20;
+    for (const auto& [name, text] : rows) {
+        auto lines = Wrap(text, width);
+        out << "  " << name;
+        if (lines.empty() || (lines.size() == 1 && lines[0].empty())) {
+            out << '\n';
+            continue;
+        }
+        out << std::string(left - name.size() + 2, ' ') << lines[0] << '\n';
+        for (size_t i = 1; i < lines.size(); ++i) {
+            out << std::string(lines[i].empty() ? 0 : indent, ' ') << lines[i] << '\n';
+        }
+    }
+}
+
+}  // namespace
+
+void PrintHelp(NamespaceNode& node, std::ostream& out) {
+    out << Usage(node) << '\n';
+    if (!node.GetDescription().empty()) {
+        out << "\nDescription:\n";
+        std::string text = node.GetDescription();
+        if (node.GetType() == NodeType::Command) text = node.GetName() + ": " + text;
+        PrintIndented(out, text, 2);
+    }
+    if (node.GetType() == NodeType::Command) {
+        auto& command = dynamic_cast<CommandSpec&>(node);
+        auto spec = command.GetInputSpec();
+        out << "\nCmd options:\n";
+        if (spec->GetParameters().empty()) {
+            out << "  (none)\n";
+            return;
+        }
+        std::vector<std::pair<std::string, std::string>> rows;
+        for (const auto& parameter : spec->GetParameters()) {
+            rows.emplace_back(OptionSynopsis(*parameter), ParameterText(*parameter));
+        }
+        PrintColumns(out, rows);
+        return;
+    }
+    std::vector<std::pair<std::string, std::string>> namespaces;
+    std::vector<std::pair<std::string, std::string>> commands;
+    const auto names = node.GetNamespaceNodeNames();
+    const auto children = node.GetNamespaceNodes();
+    for (size_t i = 0; i < children.size(); ++i) {
+        auto& list = children[i]->GetType() == NodeType::Command ? commands : namespaces;
+        list.emplace_back(names[i], children[i]->GetDescription());
+    }
+    if (!namespaces.empty()) {
+        out << "\nAvailable Namespaces:\n";
+        PrintColumns(out, namespaces);
+    }
+    if (!commands.empty()) {
+        out << "\nAvailable Commands:\n";
+        PrintColumns(out, commands);
+    }
+}
+
+}  // namespace CmdKit::Detail

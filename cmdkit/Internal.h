@@ -1,0 +1,41 @@
+// The framework's private pieces: option lookup, help and formatters.
+#pragma once
+
+#include <iosfwd>
+#include <map>
+#include <memory>
+#include <string>
+
+#include "cmdkit/AutoCli.h"
+
+namespace CmdKit::Detail {
+
+// The parameter an option word (`--name`, `--name=value`, `-n`, `-n=value`) names, or null.
+// `hasInlineValue` tells whether the word carried `=value`.
+std::shared_ptr<CallSpec::ParameterSpec> FindOption(const CallSpec::InputSpec& spec,
+                                                    const std::string& word, bool& hasInlineValue);
+
+// True when the parameter's value is the next word (no `=` in the option word).
+inline bool TakesValue(const CallSpec::ParameterSpec& parameter) {
+    return parameter.GetType() != CallSpec::PARAM_FLAG;
+}
+
+// The help of a namespace or command.
+void PrintHelp(AutoCli::NamespaceNode& node, std::ostream& out);
+
+using Hints = std::map<std::string, std::string>;
+
+struct FormatContext {
+    Hints hints;
+    // The command's declared result, used for field order where the result's own order differs.
+    std::shared_ptr<MetaObj::MetaObject> prototype;
+    // Terminal width when standard output is a terminal, otherwise 0 (never cut or wrap).
+    size_t terminalWidth = 0;
+};
+
+bool IsFormatterName(const std::string& name);
+// Writes `result` (non-null) with the named formatter.
+void Format(const std::string& formatter, const MetaObj::MetaObject& result,
+            const FormatContext& context, std::ostream& out);
+
+}  // namespace CmdKit::Detail

@@ -1,0 +1,149 @@
+// Result objects: structures, lists and scalars.
+#include "cmdkit/MetaObj.h"
+
+#include "cmdkit/CmdKitException.h"
+
+namespace CmdKit::MetaObj {
+
+const std::string MetaStruct::_docEmpty;
+
+std::shared_ptr<MetaString> MetaString::New() {
+    return std::shared_ptr<MetaString>(new MetaString);
+}
+
+std::shared_ptr<MetaString> MetaString::New(const std::string& text) {
+    auto object = New();
+    object->SetValue(text);
+    return object;
+}
+
+std::shared_ptr<MetaInt> MetaInt::New() {
+    return std::shared_ptr<MetaInt>(new MetaInt);
+}
+
+std::shared_ptr<MetaInt> MetaInt::New(long value) {
+    auto object = New();
+    object->SetValue(value);
+    return object;
+}
+
+std::shared_ptr<MetaBool> MetaBool::New() {
+    return std::shared_ptr<MetaBool>(new MetaBool);
+}
+
+std::shared_ptr<MetaBool> MetaBool::New(bool value) {
+    auto object = New();
+    object->SetValue(value);
+    return object;
+}
+
+std::shared_ptr<MetaStruct> MetaStruct::New(const std::string& name) {
+    return std::shared_ptr<MetaStruct>(new MetaStruct(name));
+}
+
+void MetaStruct::Put(const std::string& name, std::shared_ptr<MetaObject> value,
+                     const std::string& doc) {
+    for (auto& field : fields_) {
+        if (field.name == name) {
+            field.value = std::move(value);
+            field.description = doc;
+            return;
+        }
+    }
+    fields_.push_back(Field{name, std::move(value), doc});
+}
+
+void MetaStruct::SetField(const std::string& name, const std::string& value,
+                          const std::string& doc) {
+    Put(name, MetaString::New(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, const char* value, const std::string& doc) {
+    Put(name, MetaString::New(value ? value : ""), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, int value, const std::string& doc) {
+    Put(name, MetaInt::New(static_cast<long>(value)), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, long value, const std::string& doc) {
+    Put(name, MetaInt::New(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, bool value, const std::string& doc) {
+    Put(name, MetaBool::New(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, const std::vector<std::string>& value,
+                          const std::string& doc) {
+    auto list = MetaList::New(META_STRING);
+    list->Reserve(value.size());
+    for (const auto& text : value) list->Add(text);
+    Put(name, list, doc);
+}
+
+void MetaStruct::SetField(const std::string& name, std::shared_ptr<MetaString> value,
+                          const std::string& doc) {
+    Put(name, std::move(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, std::shared_ptr<MetaInt> value,
+                          const std::string& doc) {
+    Put(name, std::move(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, std::shared_ptr<MetaBool> value,
+                          const std::string& doc) {
+    Put(name, std::move(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, std::shared_ptr<MetaList> value,
+                          const std::string& doc) {
+    Put(name, std::move(value), doc);
+}
+
+void MetaStruct::SetField(const std::string& name, std::shared_ptr<MetaStruct> value,
+                          const std::string& doc) {
+    Put(name, std::move(value), doc);
+}
+
+std::shared_ptr<MetaObject> MetaStruct::GetField(const std::string& name) const {
+    for (const auto& field : fields_) {
+        if (field.name == name) return field.value;
+    }
+    return nullptr;
+}
+
+std::shared_ptr<MetaList> MetaList::New(int elementType) {
+    return New(elementType, nullptr);
+}
+
+std::shared_ptr<MetaList> MetaList::New(int elementType, std::shared_ptr<MetaStruct> prototype) {
+    if (elementType != META_STRING && elementType != META_STRUCT) {
+        throw CmdKitException("A list holds strings or structures, not element type " +
+                              std::to_string(elementType));
+    }
+    return std::shared_ptr<MetaList>(new MetaList(elementType, std::move(prototype)));
+}
+
+void MetaList::Add(const std::string& text) {
+    Add(MetaString::New(text));
+}
+
+void MetaList::Add(std::shared_ptr<MetaString> text) {
+    if (!text) throw CmdKitException("Cannot add a null string to a list");
+    if (elementType_ != META_STRING) {
+        throw CmdKitException("Cannot add a string to a list of structures");
+    }
+    elements_.push_back(std::move(text));
+}
+
+void MetaList::Add(std::shared_ptr<MetaStruct> row) {
+    if (!row) throw CmdKitException("Cannot add a null structure to a list");
+    if (elementType_ != META_STRUCT) {
+        throw CmdKitException("Cannot add a structure to a list of strings");
+    }
+    elements_.push_back(std::move(row));
+}
+
+}  // namespace CmdKit::MetaObj

@@ -1,0 +1,96 @@
+// Running a host command line on behalf of the invoking user.
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <boost/algorithm/string/classification.hpp>
+#include <boost/algorithm/string/split.hpp>
+#include <cerrno>
+#include <cstring>
+
+#include "cmdkit/AutoCli.h"
+
+extern char** environ;
+
+namespace CmdKit::AutoCli {
+
+namespace {
+
+// Runs argv[0] as given (no shell, no PATH search) and collects what it writes to standard
+// output and standard error, in the order it writes it.
+int DefaultRunner(const std::vector<std::string>& argv, const std::string& /*user*/,
+                  std::string& output) {
+    int fds[2];
+    if (pipe2(fds, O_CLOEXEC) != 0) {
+        output = "Cannot run " + argv[0] + ": " + std::strerror(errno);
+        return 127;
+    }
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_adddup2(&actions, fds[1], STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, fds[1], STDERR_FILENO);
+
+    std::vector<char*> args;
+    args.reserve(argv.size() + 1);
+    for (const auto& word : argv) args.push_back(const_cast<char*>(word.c_str()));
+    args.push_back(nullptr);
+
+    pid_t pid = 0;
+    int rc = posix_spawn(&pid, argv[0].c_str(), &actions, nullptr, args.data(), environ);
+    posix_spawn_file_actions_destroy(&actions);
+    close(fds[1]);
+    if (rc != 0) {
+        close(fds[0]);
+        output = "Cannot run " + argv[0] + ": " + std::strerror(rc);
+        return 127;
+    }
+
+    output.clear();
+    char buffer[4096];
+    for (;;) {
+        ssize_t n = read(fds[0], buffer, sizeof buffer);
+        if (n > 0) {
+            output.append(buffer, static_cast<size_t>(n));
+        } else if (n == 0 || errno != EINTR) {
+            break;
+        }
+    }
+    close(fds[0]);
+
+    int status = 0;
+    while (waitpid(pid, &status, 0) < 0) {
+        if (errno != EINTR) {
+            output += std::string("Cannot wait for ") + argv[0] + ": " + std::strerror(errno);
+            return 127;
+        }
+    }
+    if (WIFEXITED(status)) return WEXITSTATUS(status);
+    if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
+    return 127;
+}
+
+std::atomic<HostCommandRunner> runner{&DefaultRunner};
+
+}  // namespace
+
+void SetHostCommandRunner(HostCommandRunner newRunner) {
+    runner.store(newRunner ? newRunner : &DefaultRunner);
+}
+
+int AutoCli_ShellCmdWithKvUsername(const std::string& commandLine, const std::string& user,
+                                   std::string& output, const std::string& /*extra*/) {
+    std::vector<std::string> argv;
+    boost::algorithm::split(argv, commandLine, boost::algorithm::is_space(),
+                            boost::algorithm::token_compress_on);
+    std::erase_if(argv, [](const std::string& word) { return word.empty(); });
+    if (argv.empty()) {
+        output = "Cannot run an empty command line";
+        return 127;
+    }
+    return runner.load()(argv, user, output);
+}
+
+}  // namespace CmdKit::AutoCli

@@ -1,0 +1,337 @@
+// The kernel-control adapters of the advanced-option tree.
+#include <string>
+#include <vector>
+
+#include "core/Store.h"
+#include "hostctl/HostCtlException.h"
+#include "kernctl/Adv.h"
+
+using BrixSim::Store;
+using HostCtl::Lib::HostCtlException;
+
+namespace {
+
+const bool registered = BrixSim::RegisterOperations({
+    "KernCtl::Adv::AdvancedOptionImpl::FindOption",
+    "KernCtl::Adv::AdvancedOptionImpl::GetPath",
+    "KernCtl::Adv::AdvancedOptionImpl::GetType",
+    "KernCtl::Adv::AdvancedOptionImpl::GetDescription",
+    "KernCtl::Adv::AdvancedOptionImpl::ResetToDefault",
+    "KernCtl::Adv::AdvancedOptionImpl::ClearOverride",
+    "KernCtl::Adv::AdvancedOptionImpl::ApplyChange",
+    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetDefault",
+    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetMin",
+    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetMax",
+    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetValue",
+    "KernCtl::Adv::AdvancedIntegerOptionImpl::SetValue",
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetDefault",
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMin",
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMax",
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetValue",
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::SetValue",
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetDefault",
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetValidCharacters",
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetValue",
+    "KernCtl::Adv::AdvancedStringOptionImpl::SetValue",
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetDefault",
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValidCharacters",
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValue",
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::SetValue",
+    "KernCtl::Adv::AdvancedOptionBranchImpl::GetOptions",
+    "KernCtl::Adv::AdvancedOptionBranchImpl::GetBranches",
+    "KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch",
+});
+
+// Other parts of the host read this option's value from the host settings.
+constexpr char kMirroredOption[] = "/Dump/autoCreateDumpFile";
+constexpr char kMirrorKey[] = "coredump.autoCreateDumpFile";
+
+constexpr char kColumns[] =
+    "path, kind, type, description, int_value, int_default, int_min, int_max, str_value,"
+    " str_default, valid_chars";
+
+void Check(const char* className, const char* operation) {
+    Store::Get().Check(std::string(className) + "::" + operation);
+}
+
+std::unique_ptr<KernCtl::Adv::AdvancedOptionImpl> MakeOption(const BrixSim::Stmt& row) {
+    using namespace KernCtl::Adv;
+    AdvancedOptionData data;
+    data.path = row.Text(0);
+    const std::string kind = row.Text(1);
+    data.type = static_cast<int>(row.Int(2));
+    data.description = row.Text(3);
+    data.intValue = static_cast<uint32_t>(row.Int(4));
+    data.intDefault = static_cast<uint32_t>(row.Int(5));
+    data.intMin = static_cast<uint32_t>(row.Int(6));
+    data.intMax = static_cast<uint32_t>(row.Int(7));
+    data.stringValue = row.Text(8);
+    data.stringDefault = row.Text(9);
+    data.validCharacters = row.Text(10);
+    if (kind == "int") return std::make_unique<AdvancedIntegerOptionImpl>(std::move(data));
+    if (kind == "string") return std::make_unique<AdvancedStringOptionImpl>(std::move(data));
+    if (kind == "userint") return std::make_unique<AdvancedUserIntegerOptionImpl>(std::move(data));
+    if (kind == "userstring") {
+        return std::make_unique<AdvancedUserStringOptionImpl>(std::move(data));
+    }
+    return std::make_unique<AdvancedOptionImpl>(std::move(data));
+}
+
+}  // namespace
+
+namespace KernCtl::Adv {
+
+// --- every option ---
+
+AdvancedOptionImpl::AdvancedOptionImpl(AdvancedOptionData data) : data_(std::move(data)) {}
+AdvancedOptionImpl::~AdvancedOptionImpl() = default;
+
+const char* AdvancedOptionImpl::ClassName() const {
+    return "KernCtl::Adv::AdvancedOptionImpl";
+}
+
+std::unique_ptr<AdvancedOptionImpl> AdvancedOptionImpl::FindOption(const std::string& path) {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionImpl::FindOption");
+    auto row =
+        store.Prepare(std::string("SELECT ") + kColumns + " FROM adv_options WHERE path = ?");
+    row.Bind(1, path);
+    if (!row.Step()) throw HostCtlException("Unable to find option " + path, "Not found");
+    return MakeOption(row);
+}
+
+std::string AdvancedOptionImpl::GetPath() {
+    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetPath");
+    return data_.path;
+}
+
+int AdvancedOptionImpl::GetType() {
+    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetType");
+    return data_.type;
+}
+
+std::string AdvancedOptionImpl::GetDescription() {
+    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetDescription");
+    return data_.description;
+}
+
+void AdvancedOptionImpl::ResetToDefault() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault");
+    if (std::string(ClassName()) == "KernCtl::Adv::AdvancedOptionImpl") {
+        throw HostCtlException("Unable to reset option " + data_.path,
+                               "the option's value handler is not available");
+    }
+    store.Write([&] {
+        store
+            .Prepare(
+                "UPDATE adv_options SET int_value = int_default, str_value = str_default"
+                " WHERE path = ?")
+            .Bind(1, data_.path)
+            .Run();
+        if (data_.path == kMirroredOption) store.SetInt(kMirrorKey, data_.intDefault);
+        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault", {data_.path});
+    });
+    data_.intValue = data_.intDefault;
+    data_.stringValue = data_.stringDefault;
+}
+
+void AdvancedOptionImpl::ClearOverride() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionImpl::ClearOverride");
+    store.Write([&] {
+        store.Prepare("UPDATE adv_options SET user_set = 0 WHERE path = ?")
+            .Bind(1, data_.path)
+            .Run();
+        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ClearOverride", {data_.path});
+    });
+}
+
+void AdvancedOptionImpl::ApplyChange() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionImpl::ApplyChange");
+    store.Write(
+        [&] { store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ApplyChange", {data_.path}); });
+}
+
+void AdvancedOptionImpl::StoreInteger(uint32_t value) {
+    if (value < data_.intMin || value > data_.intMax) {
+        throw HostCtlException(
+            "Invalid value " + std::to_string(value) + " for option " + data_.path,
+            "the value must be between " + std::to_string(data_.intMin) + " and " +
+                std::to_string(data_.intMax));
+    }
+    auto& store = Store::Get();
+    store.Write([&] {
+        store.Prepare("UPDATE adv_options SET int_value = ?, user_set = 1 WHERE path = ?")
+            .Bind(1, int64_t{value})
+            .Bind(2, data_.path)
+            .Run();
+        if (data_.path == kMirroredOption) store.SetInt(kMirrorKey, value);
+        store.JournalCall(std::string(ClassName()) + "::SetValue", {data_.path, int64_t{value}});
+    });
+    data_.intValue = value;
+}
+
+void AdvancedOptionImpl::StoreString(const std::string& value) {
+    if (!data_.validCharacters.empty()) {
+        const auto bad = value.find_first_not_of(data_.validCharacters);
+        if (bad != std::string::npos) {
+            throw HostCtlException("Invalid value '" + value + "' for option " + data_.path,
+                                   "character '" + value.substr(bad, 1) + "' is not allowed");
+        }
+    }
+    auto& store = Store::Get();
+    store.Write([&] {
+        store.Prepare("UPDATE adv_options SET str_value = ?, user_set = 1 WHERE path = ?")
+            .Bind(1, value)
+            .Bind(2, data_.path)
+            .Run();
+        store.JournalCall(std::string(ClassName()) + "::SetValue", {data_.path, value});
+    });
+    data_.stringValue = value;
+}
+
+// --- integer options ---
+
+AdvancedIntegerOptionImpl::AdvancedIntegerOptionImpl(AdvancedOptionData data)
+    : AdvancedOptionImpl(std::move(data)) {}
+AdvancedIntegerOptionImpl::~AdvancedIntegerOptionImpl() = default;
+const char* AdvancedIntegerOptionImpl::ClassName() const {
+    return "KernCtl::Adv::AdvancedIntegerOptionImpl";
+}
+uint32_t AdvancedIntegerOptionImpl::GetDefault() {
+    Check(ClassName(), "GetDefault");
+    return data_.intDefault;
+}
+uint32_t AdvancedIntegerOptionImpl::GetMin() {
+    Check(ClassName(), "GetMin");
+    return data_.intMin;
+}
+uint32_t AdvancedIntegerOptionImpl::GetMax() {
+    Check(ClassName(), "GetMax");
+    return data_.intMax;
+}
+uint32_t AdvancedIntegerOptionImpl::GetValue() {
+    Check(ClassName(), "GetValue");
+    return data_.intValue;
+}
+void AdvancedIntegerOptionImpl::SetValue(uint32_t value) {
+    Check(ClassName(), "SetValue");
+    StoreInteger(value);
+}
+
+AdvancedUserIntegerOptionImpl::AdvancedUserIntegerOptionImpl(AdvancedOptionData data)
+    : AdvancedOptionImpl(std::move(data)) {}
+AdvancedUserIntegerOptionImpl::~AdvancedUserIntegerOptionImpl() = default;
+const char* AdvancedUserIntegerOptionImpl::ClassName() const {
+    return "KernCtl::Adv::AdvancedUserIntegerOptionImpl";
+}
+uint32_t AdvancedUserIntegerOptionImpl::GetDefault() {
+    Check(ClassName(), "GetDefault");
+    return data_.intDefault;
+}
+uint32_t AdvancedUserIntegerOptionImpl::GetMin() {
+    Check(ClassName(), "GetMin");
+    return data_.intMin;
+}
+uint32_t AdvancedUserIntegerOptionImpl::GetMax() {
+    Check(ClassName(), "GetMax");
+    return data_.intMax;
+}
+uint32_t AdvancedUserIntegerOptionImpl::GetValue() {
+    Check(ClassName(), "GetValue");
+    return data_.intValue;
+}
+void AdvancedUserIntegerOptionImpl::SetValue(uint32_t value) {
+    Check(ClassName(), "SetValue");
+    StoreInteger(value);
+}
+
+// --- string options ---
+
+AdvancedStringOptionImpl::AdvancedStringOptionImpl(AdvancedOptionData data)
+    : AdvancedOptionImpl(std::move(data)) {}
+AdvancedStringOptionImpl::~AdvancedStringOptionImpl() = default;
+const char* AdvancedStringOptionImpl::ClassName() const {
+    return "KernCtl::Adv::AdvancedStringOptionImpl";
+}
+std::string AdvancedStringOptionImpl::GetDefault() {
+    Check(ClassName(), "GetDefault");
+    return data_.stringDefault;
+}
+std::string AdvancedStringOptionImpl::GetValidCharacters() {
+    Check(ClassName(), "GetValidCharacters");
+    return data_.validCharacters;
+}
+std::string AdvancedStringOptionImpl::GetValue() {
+    Check(ClassName(), "GetValue");
+    return data_.stringValue;
+}
+void AdvancedStringOptionImpl::SetValue(const std::string& value) {
+    Check(ClassName(), "SetValue");
+    StoreString(value);
+}
+
+AdvancedUserStringOptionImpl::AdvancedUserStringOptionImpl(AdvancedOptionData data)
+    : AdvancedOptionImpl(std::move(data)) {}
+AdvancedUserStringOptionImpl::~AdvancedUserStringOptionImpl() = default;
+const char* AdvancedUserStringOptionImpl::ClassName() const {
+    return "KernCtl::Adv::AdvancedUserStringOptionImpl";
+}
+std::string AdvancedUserStringOptionImpl::GetDefault() {
+    Check(ClassName(), "GetDefault");
+    return data_.stringDefault;
+}
+std::string AdvancedUserStringOptionImpl::GetValidCharacters() {
+    Check(ClassName(), "GetValidCharacters");
+    return data_.validCharacters;
+}
+std::string AdvancedUserStringOptionImpl::GetValue() {
+    Check(ClassName(), "GetValue");
+    return data_.stringValue;
+}
+void AdvancedUserStringOptionImpl::SetValue(const std::string& value) {
+    Check(ClassName(), "SetValue");
+    StoreString(value);
+}
+
+// --- branches ---
+
+AdvancedOptionBranchImpl::AdvancedOptionBranchImpl() = default;
+AdvancedOptionBranchImpl::AdvancedOptionBranchImpl(std::string path) : path_(std::move(path)) {}
+AdvancedOptionBranchImpl::~AdvancedOptionBranchImpl() = default;
+
+std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOption>> AdvancedOptionBranchImpl::GetOptions() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetOptions");
+    auto row = store.Prepare(std::string("SELECT ") + kColumns +
+                             " FROM adv_options WHERE branch = ? ORDER BY seq");
+    row.Bind(1, path_);
+    std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOption>> options;
+    while (row.Step()) options.push_back(MakeOption(row));
+    return options;
+}
+
+std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>>
+AdvancedOptionBranchImpl::GetBranches() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetBranches");
+    auto row = store.Prepare("SELECT path FROM adv_branches WHERE parent = ? ORDER BY seq");
+    row.Bind(1, path_);
+    std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>> branches;
+    while (row.Step()) branches.push_back(std::make_unique<AdvancedOptionBranchImpl>(row.Text(0)));
+    return branches;
+}
+
+std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch> AdvancedOptionBranchImpl::GetBranch(
+    const std::string& name) {
+    auto& store = Store::Get();
+    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch");
+    auto row = store.Prepare("SELECT path FROM adv_branches WHERE parent = ? AND name = ?");
+    row.Bind(1, path_).Bind(2, name);
+    if (!row.Step()) return nullptr;
+    return std::make_unique<AdvancedOptionBranchImpl>(row.Text(0));
+}
+
+}  // namespace KernCtl::Adv

@@ -1,0 +1,104 @@
+// Console keyboard layouts: the layouts available, the stored one and the one loaded into the
+// running console.
+#include <string>
+#include <vector>
+
+#include "core/Store.h"
+#include "hostctl/HostCtlException.h"
+#include "kernctl/SystemInfoImpl.h"
+
+using BrixSim::Store;
+
+namespace {
+
+constexpr char kStoredKey[] = "keyboard.layout";
+constexpr char kLoadedKey[] = "keyboard.loaded";
+constexpr char kDefaultLayout[] = "US Default";
+
+const char* const kLayouts[] = {
+    "Belgian",  "Brazilian",  "Croatian",       "Czech",     "Danish",       "Estonian",
+    "Finnish",  "French",     "German",         "Greek",     "Icelandic",    "Italian",
+    "Japanese", "Korean",     "Latin American", "Norwegian", "Polish",       "Portuguese",
+    "Russian",  "Slovenian",  "Spanish",        "Swedish",   "Swiss French", "Swiss German",
+    "Turkish",  "UK English", "US Default",     "US Dvorak", "Ukrainian",
+};
+
+const bool registered = [] {
+    BrixSim::RegisterOperations({
+        "KernCtl::System::SystemInfoImpl::GetKeyboardLayout",
+        "KernCtl::System::SystemInfoImpl::GetKeyboardLayouts",
+        "KernCtl::System::SystemInfoImpl::SetKeyboardLayout",
+        "KernCtl::System::SystemInfoImpl::LoadKeyboardMappings",
+    });
+    return BrixSim::RegisterTables({
+        "keyboard",
+        "CREATE TABLE IF NOT EXISTS keyboard_layouts ("
+        " name TEXT PRIMARY KEY COLLATE NOCASE, seq INTEGER NOT NULL);",
+        [](Store& store) {
+            store.Write([&] {
+                auto insert =
+                    store.Prepare("INSERT INTO keyboard_layouts (name, seq) VALUES (?, ?)");
+                int64_t seq = 0;
+                for (const char* layout : kLayouts) {
+                    insert.Bind(1, layout).Bind(2, ++seq).Run();
+                    insert.Reset();
+                }
+                store.SetValue(kStoredKey, kDefaultLayout);
+                store.SetValue(kLoadedKey, kDefaultLayout);
+            });
+        },
+    });
+}();
+
+// The layout's name as the host spells it; names match without regard to case.
+std::string Known(Store& store, const std::string& name) {
+    auto row = store.Prepare("SELECT name FROM keyboard_layouts WHERE name = ?");
+    row.Bind(1, name);
+    if (!row.Step()) {
+        throw HostCtl::Lib::HostCtlException("Unknown keyboard layout '" + name + "'");
+    }
+    return row.Text(0);
+}
+
+}  // namespace
+
+namespace KernCtl::System {
+
+std::string SystemInfoImpl::GetKeyboardLayout() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::System::SystemInfoImpl::GetKeyboardLayout");
+    return store.GetValue(kStoredKey, kDefaultLayout);
+}
+
+std::vector<std::string> SystemInfoImpl::GetKeyboardLayouts() {
+    auto& store = Store::Get();
+    store.Check("KernCtl::System::SystemInfoImpl::GetKeyboardLayouts");
+    auto row = store.Prepare("SELECT name FROM keyboard_layouts ORDER BY seq");
+    std::vector<std::string> layouts;
+    while (row.Step()) layouts.push_back(row.Text(0));
+    return layouts;
+}
+
+void SystemInfoImpl::SetKeyboardLayout(const std::string& name) {
+    auto& store = Store::Get();
+    store.Check("KernCtl::System::SystemInfoImpl::SetKeyboardLayout");
+    store.Write([&] {
+        const auto layout = Known(store, name);
+        store.SetValue(kStoredKey, layout);
+        store.JournalCall("KernCtl::System::SystemInfoImpl::SetKeyboardLayout", {name});
+    });
+}
+
+void SystemInfoImpl::LoadKeyboardMappings(const std::string& name) {
+    auto& store = Store::Get();
+    store.Check("KernCtl::System::SystemInfoImpl::LoadKeyboardMappings");
+    store.Write([&] {
+        // No name reloads the stored layout.
+        const auto layout =
+            name.empty() ? store.GetValue(kStoredKey, kDefaultLayout) : Known(store, name);
+        store.SetValue(kLoadedKey, layout);
+        store.JournalCall("KernCtl::System::SystemInfoImpl::LoadKeyboardMappings", {name});
+    });
+}
+
+}  // namespace KernCtl::System

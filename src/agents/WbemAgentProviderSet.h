@@ -1,0 +1,21 @@
+#pragma once
+
+#include "frame/CommandKit.h"
+
+namespace OstrelCli::System {
+
+class WbemAgentProviderSet : public virtual CmdKit::AutoCli::Command {
+public:
+    static std::shared_ptr<WbemAgentProviderSet> New();
+    ~WbemAgentProviderSet() override;
+
+protected:
+    std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(InputPtr input, OutputPtr output) override;
+
+private:
+    WbemAgentProviderSet();
+};
+
+}  // namespace OstrelCli::System

@@ -1,0 +1,98 @@
+// A configurable command for exercising the framework in-process.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "cmdkit/AutoCli.h"
+#include "cmdkit/Cli.h"
+
+namespace CmdKitTest {
+
+namespace AutoCli = CmdKit::AutoCli;
+namespace CallSpec = CmdKit::CallSpec;
+namespace MetaObj = CmdKit::MetaObj;
+
+class FakeCommand : public virtual AutoCli::Command {
+  public:
+    using InputFactory = std::function<std::shared_ptr<CallSpec::InputSpec>()>;
+    using Work = std::function<void(CallSpec::Input&, CallSpec::Output&)>;
+
+    static std::shared_ptr<FakeCommand> New(InputFactory inputs,
+                                            std::shared_ptr<MetaObj::MetaObject> prototype,
+                                            Work work) {
+        return AdoptSelf(std::shared_ptr<FakeCommand>(
+            new FakeCommand(std::move(inputs), std::move(prototype), std::move(work))));
+    }
+    ~FakeCommand() override = default;
+
+    int inputSpecCalls = 0;
+    std::shared_ptr<CallSpec::Input> lastInput;
+
+  protected:
+    std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override {
+        ++inputSpecCalls;
+        return inputs_ ? inputs_() : CallSpec::InputSpec::New();
+    }
+    std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override {
+        auto spec = CallSpec::OutputSpec::New();
+        spec->SetRootObject(prototype_);
+        return spec;
+    }
+    void ExecuteInternal(std::shared_ptr<CallSpec::Input> input,
+                         std::shared_ptr<CallSpec::Output> output) override {
+        lastInput = input;
+        if (work_) work_(*input, *output);
+    }
+
+  private:
+    FakeCommand(InputFactory inputs, std::shared_ptr<MetaObj::MetaObject> prototype, Work work)
+        : inputs_(std::move(inputs)), prototype_(std::move(prototype)), work_(std::move(work)) {}
+
+    InputFactory inputs_;
+    std::shared_ptr<MetaObj::MetaObject> prototype_;
+    Work work_;
+};
+
+inline std::shared_ptr<CallSpec::ParameterSpec> Param(const std::string& name, int type,
+                                                      const std::string& shortName = "",
+                                                      bool required = false) {
+    auto parameter = CallSpec::ParameterSpec::New(name, type);
+    if (!shortName.empty()) parameter->SetShortName(shortName);
+    parameter->SetRequired(required);
+    return parameter;
+}
+
+struct CliRun {
+    int status = -1;
+    std::string out;
+    std::string err;
+};
+
+inline CliRun Invoke(const std::shared_ptr<AutoCli::NamespaceNode>& root,
+                     const std::vector<std::string>& args) {
+    std::ostringstream out;
+    std::ostringstream err;
+    CliRun run;
+    run.status = AutoCli::RunCli(root, args, out, err);
+    run.out = out.str();
+    run.err = err.str();
+    return run;
+}
+
+// A tree with one command at `a b <word>`.
+inline std::shared_ptr<AutoCli::Namespace> TreeWith(std::shared_ptr<FakeCommand> command,
+                                                    const std::string& word = "cmd") {
+    auto root = AutoCli::Namespace::New();
+    auto a = root->SubNamespace("a");
+    a->SetDescription("Namespace a.");
+    auto b = a->SubNamespace("b");
+    b->SetDescription("Namespace b.");
+    b->RegisterNamespaceNode(command, word);
+    return root;
+}
+
+}  // namespace CmdKitTest

@@ -1,0 +1,239 @@
+// Option parsing and checking against an input specification.
+#include <gtest/gtest.h>
+
+#include <climits>
+
+#include "FakeCommand.h"
+
+namespace CmdKitTest {
+namespace {
+
+using CallSpec::ParameterConstraint;
+
+std::shared_ptr<CallSpec::InputSpec> TestSpec() {
+    auto spec = CallSpec::InputSpec::New();
+    spec->AddParameter(Param("message", CallSpec::PARAM_STRING, "m", true));
+    spec->AddParameter(Param("name", CallSpec::PARAM_STRING, "n"));
+    auto port = Param("port", CallSpec::PARAM_INT, "P");
+    auto range = ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
+    range->SetIntRange(1, 65525);
+    port->SetConstraint(range);
+    spec->AddParameter(port);
+    auto wide = Param("wide", CallSpec::PARAM_INT);
+    auto full = ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
+    full->SetIntRange(INT64_MIN, INT64_MAX);
+    wide->SetConstraint(full);
+    spec->AddParameter(wide);
+    spec->AddParameter(Param("count", CallSpec::PARAM_INT, "c"));
+    spec->AddParameter(Param("enabled", CallSpec::PARAM_BOOL, "e"));
+    spec->AddParameter(Param("force", CallSpec::PARAM_FLAG, "f"));
+    spec->AddParameter(Param("tag", CallSpec::PARAM_STRING_LIST, "t"));
+    auto mode = Param("mode", CallSpec::PARAM_STRING);
+    auto modes = ParameterConstraint::New(CallSpec::CONSTRAINT_STRING_ENUM);
+    modes->AddStringEnum("fast", "Go fast");
+    modes->AddStringEnum("slow", "Go slow");
+    mode->SetConstraint(modes);
+    spec->AddParameter(mode);
+    auto id = Param("id", CallSpec::PARAM_STRING);
+    auto pattern = ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX);
+    pattern->SetStringRegex("[a-z]+[0-9]");
+    id->SetConstraint(pattern);
+    spec->AddParameter(id);
+    auto pin = Param("pin", CallSpec::PARAM_STRING, "p");
+    pin->SetSecret(true);
+    auto digits = ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX);
+    digits->SetStringRegex("[0-9]{4}");
+    pin->SetConstraint(digits);
+    spec->AddParameter(pin);
+    auto secretNumber = Param("secretnum", CallSpec::PARAM_INT);
+    secretNumber->SetSecret(true);
+    spec->AddParameter(secretNumber);
+    return spec;
+}
+
+std::vector<std::string> With(std::vector<std::string> args) {
+    args.insert(args.begin(), {"-m", "hello"});
+    return args;
+}
+
+struct Refusal {
+    std::vector<std::string> args;
+    std::string message;
+};
+
+class ParserRefuses : public testing::TestWithParam<Refusal> {};
+
+TEST_P(ParserRefuses, WithTheFrameworksMessage) {
+    const auto& refusal = GetParam();
+    try {
+        AutoCli::ParseArguments(*TestSpec(), refusal.args);
+        FAIL() << "accepted";
+    } catch (const CmdKit::UsageError& error) {
+        EXPECT_EQ(error.what(), refusal.message);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Table, ParserRefuses,
+    testing::Values(
+        Refusal{{}, "Error: Missing required parameter -m|--message"},
+        Refusal{{"--name", "x"}, "Error: Missing required parameter -m|--message"},
+        Refusal{With({"--foo"}), "Error: Unknown option --foo"},
+        Refusal{With({"--foo=bar"}), "Error: Unknown option --foo"},
+        Refusal{With({"-z"}), "Error: Unknown option -z"},
+        Refusal{With({"stray"}), "Error: Unexpected argument stray"},
+        Refusal{With({"--name", "a", "--name", "b"}), "Error: Option --name given more than once"},
+        Refusal{With({"-n", "a", "--name=b"}), "Error: Option --name given more than once"},
+        Refusal{With({"--force", "--force"}), "Error: Option --force given more than once"},
+        Refusal{With({"--force=yes"}), "Error: Option --force takes no value"},
+        Refusal{With({"--name"}), "Error: Missing value for --name"},
+        Refusal{With({"--count", "12x"}),
+                "Error: Invalid value for --count: 12x is not an integer"},
+        Refusal{With({"--count", ""}), "Error: Invalid value for --count:  is not an integer"},
+        Refusal{With({"--count", "1.5"}),
+                "Error: Invalid value for --count: 1.5 is not an integer"},
+        Refusal{With({"--count", "0x10"}),
+                "Error: Invalid value for --count: 0x10 is not an integer"},
+        Refusal{With({"--count", " 5"}), "Error: Invalid value for --count:  5 is not an integer"},
+        Refusal{With({"--count", "+-5"}),
+                "Error: Invalid value for --count: +-5 is not an integer"},
+        Refusal{With({"--count", "9223372036854775808"}),
+                "Error: Invalid value for --count: 9223372036854775808 is outside the 64-bit "
+                "integer range"},
+        Refusal{With({"--count", "-9223372036854775809"}),
+                "Error: Invalid value for --count: -9223372036854775809 is outside the 64-bit "
+                "integer range"},
+        Refusal{With({"--count", "99999999999999999999x"}),
+                "Error: Invalid value for --count: 99999999999999999999x is not an integer"},
+        Refusal{With({"--port", "0"}),
+                "Error: Invalid value for --port: 0 is not in the range 1..65525"},
+        Refusal{With({"--port", "65526"}),
+                "Error: Invalid value for --port: 65526 is not in the range 1..65525"},
+        Refusal{With({"-P", "70000"}),
+                "Error: Invalid value for --port: 70000 is not in the range 1..65525"},
+        Refusal{With({"--enabled", "maybe"}),
+                "Error: Invalid value for --enabled: maybe is not a boolean (yes|no, true|false, "
+                "1|0)"},
+        Refusal{With({"--enabled", "2"}),
+                "Error: Invalid value for --enabled: 2 is not a boolean (yes|no, true|false, 1|0)"},
+        Refusal{With({"--mode", "FAST"}),
+                "Error: Invalid value for --mode: FAST is not one of: fast, slow"},
+        Refusal{With({"--mode", "fas"}),
+                "Error: Invalid value for --mode: fas is not one of: fast, slow"},
+        Refusal{With({"--id", "abc1x"}),
+                "Error: Invalid value for --id: abc1x does not match the pattern [a-z]+[0-9]"},
+        Refusal{With({"--id", "Xabc1"}),
+                "Error: Invalid value for --id: Xabc1 does not match the pattern [a-z]+[0-9]"},
+        Refusal{With({"--pin", "12345"}),
+                "Error: Invalid value for --pin: the given value does not match the pattern "
+                "[0-9]{4}"},
+        Refusal{With({"--secretnum", "s3cr3t"}),
+                "Error: Invalid value for --secretnum: the given value is not an integer"}));
+
+struct Acceptance {
+    std::vector<std::string> args;
+    std::string name;                 // parameter looked at
+    std::vector<std::string> values;  // as recorded
+};
+
+class ParserAccepts : public testing::TestWithParam<Acceptance> {};
+
+TEST_P(ParserAccepts, AndRecordsTheValues) {
+    const auto& acceptance = GetParam();
+    auto input = AutoCli::ParseArguments(*TestSpec(), acceptance.args);
+    std::vector<std::string> values;
+    input->GetParameterList(acceptance.name, values);
+    EXPECT_EQ(values, acceptance.values);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Table, ParserAccepts,
+    testing::Values(
+        Acceptance{{"--message", "hi"}, "message", {"hi"}},
+        Acceptance{{"--message=hi=there"}, "message", {"hi=there"}},
+        Acceptance{{"-m", "--name"}, "message", {"--name"}}, Acceptance{{"-m=x"}, "message", {"x"}},
+        Acceptance{{"-m", ""}, "message", {""}},
+        Acceptance{With({"-t", "a", "--tag", "b", "--tag=c"}), "tag", {"a", "b", "c"}},
+        Acceptance{With({"--count", "-5"}), "count", {"-5"}},
+        Acceptance{With({"--count", "+7"}), "count", {"+7"}},
+        Acceptance{With({"--count", "9223372036854775807"}), "count", {"9223372036854775807"}},
+        Acceptance{With({"--count", "-9223372036854775808"}), "count", {"-9223372036854775808"}},
+        Acceptance{With({"--wide", "-9223372036854775808"}), "wide", {"-9223372036854775808"}},
+        Acceptance{With({"--wide", "9223372036854775807"}), "wide", {"9223372036854775807"}},
+        Acceptance{With({"--port", "1"}), "port", {"1"}},
+        Acceptance{With({"--port", "65525"}), "port", {"65525"}},
+        Acceptance{With({"--mode", "slow"}), "mode", {"slow"}},
+        Acceptance{With({"--id", "abc1"}), "id", {"abc1"}},
+        Acceptance{With({"-p", "0042"}), "pin", {"0042"}},
+        Acceptance{With({"-f"}), "force", {"true"}}));
+
+TEST(Parser, IntegersReadBackExactly) {
+    auto input = AutoCli::ParseArguments(
+        *TestSpec(), With({"--count", "-9223372036854775808", "--wide", "9223372036854775807"}));
+    EXPECT_EQ(input->GetParameterInt("count"), LONG_MIN);
+    EXPECT_EQ(input->GetParameterInt("wide"), LONG_MAX);
+}
+
+TEST(Parser, BooleanSpellingsInAnyCase) {
+    const std::vector<std::pair<std::string, bool>> spellings = {
+        {"yes", true}, {"YES", true}, {"True", true},   {"1", true},  {"tRUE", true},
+        {"no", false}, {"No", false}, {"FALSE", false}, {"0", false}, {"false", false}};
+    for (const auto& [text, expected] : spellings) {
+        auto input = AutoCli::ParseArguments(*TestSpec(), With({"--enabled", text}));
+        EXPECT_EQ(input->GetParameterBool("enabled"), expected) << text;
+    }
+}
+
+TEST(Parser, AbsentParametersAreNotGiven) {
+    auto input = AutoCli::ParseArguments(*TestSpec(), With({}));
+    EXPECT_FALSE(input->HasParameter("name"));
+    EXPECT_FALSE(input->IsFlagSet("force"));
+    EXPECT_THROW(input->GetParameter("name"), CmdKit::CmdKitException);
+    EXPECT_THROW(input->GetParameterInt("count"), CmdKit::CmdKitException);
+    EXPECT_THROW(input->GetParameterBool("enabled"), CmdKit::CmdKitException);
+    std::vector<std::string> tags{"stale"};
+    input->GetParameterList("tag", tags);
+    EXPECT_TRUE(tags.empty());
+    EXPECT_EQ(input->GetContext("user"), "");
+}
+
+TEST(Parser, FlagGivenIsSet) {
+    auto input = AutoCli::ParseArguments(*TestSpec(), With({"--force"}));
+    EXPECT_TRUE(input->HasParameter("force"));
+    EXPECT_TRUE(input->IsFlagSet("force"));
+}
+
+TEST(Parser, SecretValueNeverInAnyMessage) {
+    const std::string secret = "hunter2-topsecret";
+    const std::vector<std::vector<std::string>> attempts = {
+        With({"--pin", secret}), With({"--pin=" + secret}), With({"--secretnum", secret}),
+        With({"--pin", "1234", "--pin", secret})};
+    for (const auto& args : attempts) {
+        try {
+            AutoCli::ParseArguments(*TestSpec(), args);
+            FAIL() << "accepted";
+        } catch (const CmdKit::UsageError& error) {
+            EXPECT_EQ(std::string(error.what()).find(secret), std::string::npos) << error.what();
+        }
+    }
+}
+
+TEST(Parser, SpecificationMisuseIsRejected) {
+    EXPECT_THROW(CallSpec::ParameterSpec::New("", CallSpec::PARAM_STRING), CmdKit::CmdKitException);
+    EXPECT_THROW(CallSpec::ParameterSpec::New("x", 7), CmdKit::CmdKitException);
+    EXPECT_THROW(ParameterConstraint::New(2), CmdKit::CmdKitException);
+    EXPECT_THROW(ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE)->SetIntRange(5, 4),
+                 CmdKit::CmdKitException);
+    EXPECT_THROW(ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX)->SetStringRegex("(["),
+                 CmdKit::CmdKitException);
+    auto spec = CallSpec::InputSpec::New();
+    spec->AddParameter(Param("one", CallSpec::PARAM_STRING, "o"));
+    EXPECT_THROW(spec->AddParameter(Param("one", CallSpec::PARAM_INT)), CmdKit::CmdKitException);
+    EXPECT_THROW(spec->AddParameter(Param("other", CallSpec::PARAM_INT, "o")),
+                 CmdKit::CmdKitException);
+    EXPECT_EQ(spec->FindParameter("one")->GetShortName(), "o");
+    EXPECT_EQ(spec->FindParameter("missing"), nullptr);
+}
+
+}  // namespace
+}  // namespace CmdKitTest

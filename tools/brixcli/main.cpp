@@ -1,0 +1,73 @@
+// brixcli: loads every plug-in of its plug-in folder, then runs one invocation.
+#include <dlfcn.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <filesystem>
+#include <iostream>
+#include <string>
+#include <system_error>
+#include <vector>
+
+#include "cmdkit/Cli.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+using RegisterFunction = void (*)(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>&);
+
+fs::path PluginFolder() {
+    if (const char* folder = std::getenv("BRIXCLI_PLUGIN_DIR"); folder && *folder) return folder;
+    std::error_code error;
+    fs::path exe = fs::read_symlink("/proc/self/exe", error);
+    if (error) return fs::path("lib/brixcli/plugins");
+    return exe.parent_path() / ".." / "lib" / "brixcli" / "plugins";
+}
+
+// Loads each *.so of the folder in name order and lets it attach its branch to `root`. A
+// plug-in that cannot be loaded is reported and skipped; the others still serve.
+void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
+    const fs::path folder = PluginFolder();
+    std::error_code error;
+    std::vector<fs::path> libraries;
+    for (fs::directory_iterator it(folder, error), end; !error && it != end; it.increment(error)) {
+        if (it->path().extension() == ".so") libraries.push_back(it->path());
+    }
+    std::sort(libraries.begin(), libraries.end());
+    for (const auto& library : libraries) {
+        // Plug-ins stay loaded for the life of the process: the tree holds their objects.
+        void* handle = dlopen(library.c_str(), RTLD_NOW | RTLD_LOCAL);
+        if (!handle) {
+            std::cerr << "brixcli: cannot load plug-in " << library.string() << ": " << dlerror()
+                      << '\n';
+            continue;
+        }
+        auto entry =
+            reinterpret_cast<RegisterFunction>(dlsym(handle, "AutoCli_RegisterNamespaces"));
+        if (!entry) {
+            std::cerr << "brixcli: plug-in " << library.string()
+                      << " has no AutoCli_RegisterNamespaces\n";
+            continue;
+        }
+        try {
+            entry(root);
+        } catch (const std::exception& failure) {
+            std::cerr << "brixcli: plug-in " << library.string()
+                      << " failed to register: " << failure.what() << '\n';
+        }
+    }
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    auto root = CmdKit::AutoCli::Namespace::New();
+    LoadPlugins(root);
+    std::vector<std::string> args(argv + 1, argv + argc);
+    int status = CmdKit::AutoCli::RunCli(root, args, std::cout, std::cerr);
+    std::cout.flush();
+    std::cerr.flush();
+    return status;
+}
