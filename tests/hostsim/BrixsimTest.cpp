@@ -28,10 +28,10 @@ TEST(Brixsim, InitRefusesAnExistingHostUnlessForced) {
                              "; use init --force to recreate it\n");
 
     ASSERT_EQ(host.Sim({"--root", root.string(), "feature", "set", "7", "on"}).status, 0);
-    fs::create_directories(root / "etc/ostrel");
+    fs::create_directories(root / "leftover/dir");
     auto forced = host.Sim({"--root", root.string(), "init", "--force"});
     ASSERT_EQ(forced.status, 0) << forced.err;
-    EXPECT_FALSE(fs::exists(root / "etc"));
+    EXPECT_FALSE(fs::exists(root / "leftover"));
     EXPECT_EQ(host.Sim({"--root", root.string(), "feature", "get", "7"}).out, "off\n");
 }
 
