@@ -1,4 +1,4 @@
-// Call specifications and the per-invocation Input and Output.
+// Call descriptions and the per-invocation Input and Output.
 #include "cmdkit/CallSpec.h"
 
 #include <boost/algorithm/string/case_conv.hpp>

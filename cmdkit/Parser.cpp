@@ -1,4 +1,4 @@
-// Parsing and checking a command's option words against its input specification.
+// Parsing and checking a command's option words against its declared input.
 #include <regex>
 
 #include "Internal.h"

@@ -1,4 +1,4 @@
-// The command tree: namespace nodes, command specifications and commands.
+// The command tree: namespace nodes, command descriptions and commands.
 #pragma once
 
 #include <map>

@@ -1,4 +1,4 @@
-// Call specifications: what a command accepts (InputSpec) and answers (OutputSpec), and the
+// Call descriptions: what a command accepts (InputSpec) and answers (OutputSpec), and the
 // per-invocation Input and Output objects.
 #pragma once
 

@@ -10,7 +10,7 @@
 
 namespace CmdKit::AutoCli {
 
-// Parses option words against a command's input specification. Throws UsageError with the
+// Parses option words against a command's declared input. Throws UsageError with the
 // framework's message for an unknown, repeated (non-list), missing or ill-typed option or a
 // constraint violation.
 std::shared_ptr<CallSpec::Input> ParseArguments(const CallSpec::InputSpec& spec,

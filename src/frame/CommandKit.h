@@ -17,7 +17,7 @@ namespace MetaObj = CmdKit::MetaObj;
 using InputPtr = std::shared_ptr<CmdKit::CallSpec::Input>;
 using OutputPtr = std::shared_ptr<CmdKit::CallSpec::Output>;
 
-// Builds an input specification parameter by parameter, in declaration order.
+// Builds an declared input parameter by parameter, in declaration order.
 class Params {
 public:
     Params() : spec_(CallSpec::InputSpec::New()) {}
@@ -43,7 +43,7 @@ std::shared_ptr<CallSpec::ParameterConstraint> StringEnum(
     std::initializer_list<std::pair<const char*, const char*>> valuesAndDescriptions);
 std::shared_ptr<CallSpec::ParameterConstraint> Regex(const std::string& pattern);
 
-// An output specification whose root is `prototype`.
+// An declared output whose root is `prototype`.
 std::shared_ptr<CallSpec::OutputSpec> Returns(std::shared_ptr<MetaObj::MetaObject> prototype);
 // A list of structures shaped like `prototype`.
 std::shared_ptr<MetaObj::MetaList> StructList(std::shared_ptr<MetaObj::MetaStruct> prototype);

@@ -1,4 +1,4 @@
-// Option parsing and checking against an input specification.
+// Option parsing and checking against an declared input.
 #include <gtest/gtest.h>
 
 #include <climits>
@@ -218,7 +218,7 @@ TEST(Parser, SecretValueNeverInAnyMessage) {
     }
 }
 
-TEST(Parser, SpecificationMisuseIsRejected) {
+TEST(Parser, DeclarationMisuseIsRejected) {
     EXPECT_THROW(CallSpec::ParameterSpec::New("", CallSpec::PARAM_STRING), CmdKit::CmdKitException);
     EXPECT_THROW(CallSpec::ParameterSpec::New("x", 7), CmdKit::CmdKitException);
     EXPECT_THROW(ParameterConstraint::New(2), CmdKit::CmdKitException);

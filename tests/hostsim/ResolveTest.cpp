@@ -16,10 +16,10 @@ TEST(Resolve, ConfinesPathsToTheRoot) {
     BrixTest::TempHost host;
     const fs::path root = Store::Get().Root();
     fs::create_directories(root / "etc/ostrel");
-    fs::create_directories(root / "vmfs/volumes/ds1");
+    fs::create_directories(root / "datastores/ds1");
     fs::create_symlink("/etc", root / "etc/outside");             // absolute, leaves the root
-    fs::create_symlink("../../..", root / "vmfs/volumes/up");     // climbs out of the root
-    fs::create_symlink("ds1", root / "vmfs/volumes/datastore1");  // stays inside
+    fs::create_symlink("../../..", root / "datastores/up");     // climbs out of the root
+    fs::create_symlink("ds1", root / "datastores/datastore1");  // stays inside
     fs::create_symlink("/etc/passwd", root / "etc/passwd-link");  // a file link that leaves
     fs::create_symlink("ostrel", root / "etc/ostrel-link");
     fs::create_symlink("loop-b", root / "loop-a");
@@ -43,8 +43,8 @@ TEST(Resolve, ConfinesPathsToTheRoot) {
         {"/etc/../../x", nullptr},
         {"/etc/outside/passwd", nullptr},
         {"/etc/outside", nullptr},
-        {"/vmfs/volumes/up/etc/passwd", nullptr},
-        {"/vmfs/volumes/datastore1/dump.1", "vmfs/volumes/ds1/dump.1"},
+        {"/datastores/up/etc/passwd", nullptr},
+        {"/datastores/datastore1/dump.1", "datastores/ds1/dump.1"},
         {"/etc/passwd-link", nullptr},
         {"/etc/ostrel-link", "etc/ostrel-link"},  // the link itself, which stays inside
         {"/loop-a/x", nullptr},

@@ -94,11 +94,11 @@ TEST(MaintenanceMode, FailuresAreReported) {
     EXPECT_EQ(State(host), "Disabled");
 
     // A state that cannot be read is reported with its detail, before anything runs.
-    host.Fault(kGetState, "state unavailable", 0, "hostd busy");
+    host.Fault(kGetState, "state unavailable", 0, "management service busy");
     JournalMark none(host);
     ExpectRefused(host.Cli({"system", "maintenanceMode", "set", "-e", "true"}),
-                  "state unavailable (hostd busy)");
-    ExpectRefused(host.Cli({"system", "maintenanceMode", "get"}), "state unavailable (hostd busy)");
+                  "state unavailable (management service busy)");
+    ExpectRefused(host.Cli({"system", "maintenanceMode", "get"}), "state unavailable (management service busy)");
     EXPECT_TRUE(none.Added({"exec"}).empty());
 
     // An unlisted Dorna mode is the framework's to refuse.

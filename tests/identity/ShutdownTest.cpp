@@ -91,11 +91,11 @@ TEST(Shutdown, RefusalsInOrder) {
 
     // The reason's length is checked before the state is read: 513 characters are refused even
     // when the state cannot be read, 512 reach the state.
-    host.Fault(kGetState, "no state", 0, "hostd restarting");
+    host.Fault(kGetState, "no state", 0, "management service restarting");
     ExpectRefused(host.Cli({"system", "shutdown", "reboot", "-r", std::string(513, 'r')}),
                   "Reason message cannot be longer than 512 characters.");
     ExpectRefused(host.Cli({"system", "shutdown", "reboot", "-r", std::string(512, 'r')}),
-                  "no state (hostd restarting)");
+                  "no state (management service restarting)");
     host.ClearFaults();
     EXPECT_TRUE(mark.Added(kSteps).empty());
 
