@@ -8,7 +8,7 @@
 #include <utility>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/AutoCli.h"
 #include "modules/KernelLogList.h"
@@ -19,7 +19,7 @@ namespace {
 
 namespace CallSpec = CmdKit::CallSpec;
 namespace MetaObj = CmdKit::MetaObj;
-using ModulesTest::Calls;
+using BrixTest::Calls;
 using nlohmann::json;
 
 using Args = std::vector<std::pair<std::string, std::string>>;

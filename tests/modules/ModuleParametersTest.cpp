@@ -4,15 +4,15 @@
 #include <string>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 #include "cmdkit/CallSpec.h"
 #include "modules/ModuleParametersCopy.h"
 
 namespace {
 
-using ModulesTest::Calls;
-using ModulesTest::Column;
-using ModulesTest::Json;
+using BrixTest::Calls;
+using BrixTest::Column;
+using BrixTest::Json;
 using nlohmann::json;
 
 const std::vector<std::string> kList = {"system", "module", "parameters", "list"};

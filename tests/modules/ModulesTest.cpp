@@ -5,13 +5,13 @@
 #include <string>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 
 namespace {
 
-using ModulesTest::Calls;
-using ModulesTest::Column;
-using ModulesTest::Json;
+using BrixTest::Calls;
+using BrixTest::Column;
+using BrixTest::Json;
 using nlohmann::json;
 
 const std::vector<std::string> kGet = {"system", "module", "get"};

@@ -5,15 +5,15 @@
 #include <string>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 #include "core/Store.h"
 
 namespace {
 
 using nlohmann::json;
-using SettingsTest::Calls;
-using SettingsTest::Column;
-using SettingsTest::Json;
+using BrixTest::Calls;
+using BrixTest::Column;
+using BrixTest::Json;
 
 const std::vector<std::string> kList = {"system", "settings", "advanced", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "advanced", "set"};

@@ -8,15 +8,15 @@
 #include <string>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 #include "os/HostOs.h"
 
 namespace {
 
 using nlohmann::json;
-using SettingsTest::Calls;
-using SettingsTest::Column;
-using SettingsTest::Json;
+using BrixTest::Calls;
+using BrixTest::Column;
+using BrixTest::Json;
 
 const std::vector<std::string> kList = {"system", "settings", "kernel", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "kernel", "set"};

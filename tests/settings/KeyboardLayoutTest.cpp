@@ -5,14 +5,14 @@
 #include <string>
 #include <vector>
 
-#include "CliJson.h"
+#include "support/CliJson.h"
 
 namespace {
 
 using nlohmann::json;
-using SettingsTest::Calls;
-using SettingsTest::Column;
-using SettingsTest::Json;
+using BrixTest::Calls;
+using BrixTest::Column;
+using BrixTest::Json;
 
 const std::vector<std::string> kGet = {"system", "settings", "keyboard", "layout", "get"};
 const std::vector<std::string> kSet = {"system", "settings", "keyboard", "layout", "set"};

@@ -7,7 +7,7 @@
 
 #include "support/TestHost.h"
 
-namespace ModulesTest {
+namespace BrixTest {
 
 struct JsonRun {
     int status = -1;
@@ -46,4 +46,4 @@ inline std::vector<std::string> Column(const nlohmann::json& rows, const std::st
     return values;
 }
 
-}  // namespace ModulesTest
+}  // namespace BrixTest
