@@ -48,6 +48,10 @@ struct Case {
     std::string err;
 };
 
+void PrintTo(const Case& row, std::ostream* out) {
+    PrintWords(row.args, out);
+}
+
 class Invocation : public testing::TestWithParam<Case> {};
 
 TEST_P(Invocation, PrintsAndExits) {
@@ -94,7 +98,10 @@ INSTANTIATE_TEST_SUITE_P(
              "",
              "Error: Unknown command or namespace a x\nValid choices under a: b\n"},
         Case{{"zz"}, 2, "", "Error: Unknown command or namespace zz\nValid choices: a\n"},
-        Case{{"a", "b", "--bogus"}, 2, "", "Error: Unknown option --bogus\n"}));
+        Case{{"a", "b", "--bogus"}, 2, "", "Error: Unknown option --bogus\n"}),
+    [](const testing::TestParamInfo<Case>& info) {
+        return WordsTestName(info.param.args, info.index);
+    });
 
 TEST(Cli, NamespaceWithoutCommandShowsHelpAndFails) {
     auto run = Invoke(TreeWith(Echo()), {"a", "b"});

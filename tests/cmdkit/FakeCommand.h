@@ -1,8 +1,10 @@
 // A configurable command for exercising the framework in-process.
 #pragma once
 
+#include <cctype>
 #include <functional>
 #include <memory>
+#include <ostream>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -11,6 +13,25 @@
 #include "cmdkit/Cli.h"
 
 namespace CmdKitTest {
+
+// A readable, unique test name for a table row of command-line words: its index, then the
+// words with everything but letters and digits dropped ("7_count_12x").
+inline std::string WordsTestName(const std::vector<std::string>& words, size_t index) {
+    std::string name = std::to_string(index);
+    for (const auto& word : words) {
+        std::string kept;
+        for (char c : word) {
+            if (std::isalnum(static_cast<unsigned char>(c))) kept += c;
+        }
+        if (!kept.empty()) name += "_" + kept;
+    }
+    return name;
+}
+
+// Test output shows a row of command-line words as they would be typed.
+inline void PrintWords(const std::vector<std::string>& words, std::ostream* out) {
+    for (size_t i = 0; i < words.size(); ++i) *out << (i ? " " : "") << words[i];
+}
 
 namespace AutoCli = CmdKit::AutoCli;
 namespace CallSpec = CmdKit::CallSpec;

@@ -64,6 +64,11 @@ struct Expectation {
     std::string out;
 };
 
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const Expectation& row, std::ostream* out) {
+    *out << row.name;
+}
+
 class Formatter : public testing::TestWithParam<Expectation> {};
 
 TEST_P(Formatter, Prints) {

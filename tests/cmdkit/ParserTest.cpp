@@ -61,6 +61,10 @@ struct Refusal {
     std::string message;
 };
 
+void PrintTo(const Refusal& row, std::ostream* out) {
+    PrintWords(row.args, out);
+}
+
 class ParserRefuses : public testing::TestWithParam<Refusal> {};
 
 TEST_P(ParserRefuses, WithTheFrameworksMessage) {
@@ -128,13 +132,20 @@ INSTANTIATE_TEST_SUITE_P(
                 "Error: Invalid value for --pin: the given value does not match the pattern "
                 "[0-9]{4}"},
         Refusal{With({"--secretnum", "s3cr3t"}),
-                "Error: Invalid value for --secretnum: the given value is not an integer"}));
+                "Error: Invalid value for --secretnum: the given value is not an integer"}),
+    [](const testing::TestParamInfo<Refusal>& info) {
+        return WordsTestName(info.param.args, info.index);
+    });
 
 struct Acceptance {
     std::vector<std::string> args;
     std::string name;                 // parameter looked at
     std::vector<std::string> values;  // as recorded
 };
+
+void PrintTo(const Acceptance& row, std::ostream* out) {
+    PrintWords(row.args, out);
+}
 
 class ParserAccepts : public testing::TestWithParam<Acceptance> {};
 
@@ -165,7 +176,10 @@ INSTANTIATE_TEST_SUITE_P(
         Acceptance{With({"--mode", "slow"}), "mode", {"slow"}},
         Acceptance{With({"--id", "abc1"}), "id", {"abc1"}},
         Acceptance{With({"-p", "0042"}), "pin", {"0042"}},
-        Acceptance{With({"-f"}), "force", {"true"}}));
+        Acceptance{With({"-f"}), "force", {"true"}}),
+    [](const testing::TestParamInfo<Acceptance>& info) {
+        return WordsTestName(info.param.args, info.index);
+    });
 
 TEST(Parser, IntegersReadBackExactly) {
     auto input = AutoCli::ParseArguments(

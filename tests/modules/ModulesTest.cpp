@@ -163,6 +163,11 @@ struct LoadCase {
     std::string message;
 };
 
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const LoadCase& row, std::ostream* out) {
+    *out << row.name;
+}
+
 class ModuleLoadRefusals : public testing::TestWithParam<LoadCase> {
   protected:
     BrixTest::TempHost host;

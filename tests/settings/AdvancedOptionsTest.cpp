@@ -5,15 +5,15 @@
 #include <string>
 #include <vector>
 
-#include "support/CliJson.h"
 #include "core/Store.h"
+#include "support/CliJson.h"
 
 namespace {
 
-using nlohmann::json;
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using nlohmann::json;
 
 const std::vector<std::string> kList = {"system", "settings", "advanced", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "advanced", "set"};
@@ -141,6 +141,11 @@ struct SetCase {
     std::vector<std::string> args;
     std::string message;
 };
+
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const SetCase& row, std::ostream* out) {
+    *out << row.name;
+}
 
 class AdvancedSetRefusals : public testing::TestWithParam<SetCase> {
   protected:

@@ -104,6 +104,11 @@ struct RowCase {
     std::vector<std::string> values;
 };
 
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const RowCase& row, std::ostream* out) {
+    *out << row.name;
+}
+
 class FormatOptionRows : public testing::TestWithParam<RowCase> {};
 
 TEST_P(FormatOptionRows, ShapesTheRow) {
@@ -284,6 +289,11 @@ struct WalkCase {
     bool delta;
     std::vector<std::string> paths;
 };
+
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const WalkCase& row, std::ostream* out) {
+    *out << row.name;
+}
 
 class FormatBranchWalk : public testing::TestWithParam<WalkCase> {};
 

@@ -17,6 +17,11 @@ struct Case {
     bool delta;
 };
 
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const Case& row, std::ostream* out) {
+    *out << row.name;
+}
+
 class IsDeltaTest : public testing::TestWithParam<Case> {};
 
 TEST_P(IsDeltaTest, ComparesByType) {

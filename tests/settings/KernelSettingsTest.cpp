@@ -8,15 +8,15 @@
 #include <string>
 #include <vector>
 
-#include "support/CliJson.h"
 #include "os/HostOs.h"
+#include "support/CliJson.h"
 
 namespace {
 
-using nlohmann::json;
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using nlohmann::json;
 
 const std::vector<std::string> kList = {"system", "settings", "kernel", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "kernel", "set"};
@@ -104,6 +104,11 @@ struct Refusal {
     std::vector<std::string> args;
     std::string message;
 };
+
+// Test output names the row instead of dumping its bytes.
+void PrintTo(const Refusal& row, std::ostream* out) {
+    *out << row.name;
+}
 
 class KernelSettingRefusals : public testing::TestWithParam<Refusal> {
   protected:

@@ -9,10 +9,10 @@
 
 namespace {
 
-using nlohmann::json;
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using nlohmann::json;
 
 const std::vector<std::string> kGet = {"system", "settings", "keyboard", "layout", "get"};
 const std::vector<std::string> kSet = {"system", "settings", "keyboard", "layout", "set"};
