@@ -29,6 +29,11 @@ std::map<std::string, FileSystemType>& FileSystemTypes() {
     return types;
 }
 
+std::vector<std::function<void(Store&)>>& BootSteps() {
+    static std::vector<std::function<void(Store&)>> steps;
+    return steps;
+}
+
 }  // namespace
 
 bool RegisterTables(TableSet tables) {
@@ -54,6 +59,15 @@ bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler) {
 bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler) {
     FileSystemTypes()[fstype] = std::move(handler);
     return true;
+}
+
+bool RegisterBootStep(std::function<void(Store&)> step) {
+    BootSteps().push_back(std::move(step));
+    return true;
+}
+
+void RunBootSteps(Store& store) {
+    for (const auto& step : BootSteps()) step(store);
 }
 
 const std::vector<TableSet>& RegisteredTables() {

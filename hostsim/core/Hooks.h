@@ -13,7 +13,8 @@ namespace BrixSim {
 // instance named by `instancePath` (empty for the node's only record), `list` names the
 // instances below it. Both may throw HostCtl::Lib::HostCtlException.
 struct SysinfoNode {
-    std::function<void(const std::vector<std::string>& instancePath, void* buffer, size_t size)> get;
+    std::function<void(const std::vector<std::string>& instancePath, void* buffer, size_t size)>
+        get;
     std::function<std::vector<std::string>(const std::vector<std::string>& instancePath)> list;
 };
 bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler);
@@ -28,5 +29,12 @@ struct FileSystemType {
     std::function<int(const std::string& target)> umount;
 };
 bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler);
+
+class Store;
+// What the host does as it starts again after a reboot or power-off: run in registration order,
+// inside the write transaction that records the signal to init, so a restart is all or nothing.
+// State the kernel keeps only while running (levels set for this boot, active targets) goes
+// back to what is configured.
+bool RegisterBootStep(std::function<void(Store&)> step);
 
 }  // namespace BrixSim

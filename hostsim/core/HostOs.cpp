@@ -158,12 +158,15 @@ int kill(pid_t pid, int signal) {
             store.Journal("signal", {{"pid", static_cast<int64_t>(pid)},
                                      {"signal", static_cast<int64_t>(signal)}});
             // init reboots on SIGTERM and powers off on SIGUSR2.
+            // A powered-off host is taken as switched on again by the next use.
             if (signal == SIGTERM) {
                 store.SetValue("power.last", "reboot");
                 store.SetInt("power.reboots", store.GetInt("power.reboots", 0) + 1);
+                BrixSim::RunBootSteps(store);
             } else if (signal == SIGUSR2) {
                 store.SetValue("power.last", "poweroff");
                 store.SetInt("power.poweroffs", store.GetInt("power.poweroffs", 0) + 1);
+                BrixSim::RunBootSteps(store);
             }
         });
         return 0;

@@ -17,5 +17,7 @@ const std::vector<TableSet>& RegisteredTables();
 std::vector<std::string> RegisteredOperations();
 const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes();
 const std::map<std::string, FileSystemType>& RegisteredFileSystemTypes();
+// Restarts the host's running state; called inside a write transaction.
+void RunBootSteps(Store& store);
 
 }  // namespace BrixSim

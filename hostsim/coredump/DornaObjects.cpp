@@ -252,19 +252,30 @@ void StorageInfoImpl::DeactivateDiagnosticDorna() {
                               [&](Store& s) { s.SetValue(kDornaKeys.active, ""); });
 }
 
+namespace {
+
+// The configured object when it is usable, otherwise the oldest usable one; "" when none.
+std::string ChooseDorna(Store& store) {
+    const std::string configured = store.GetValue(kDornaKeys.configured, "");
+    if (auto row = FindObject(store, configured); row && row->allocated) return configured;
+    for (const auto& uuid : AllObjects(store)) {
+        if (auto row = FindObject(store, uuid); row && row->allocated) return uuid;
+    }
+    return "";
+}
+
+// At boot the host activates its Dorna dump object by the same choice.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](Store& store) { store.SetValue(kDornaKeys.active, ChooseDorna(store)); });
+
+}  // namespace
+
 std::unique_ptr<DiagnosticDorna> StorageInfoImpl::SmartActivateDiagnosticDorna() {
     auto& store = Store::Get();
     store.Check(kSmart);
     std::string chosen;
     store.Write([&] {
-        // The configured object when it is usable, otherwise the oldest usable one.
-        const std::string configured = store.GetValue(kDornaKeys.configured, "");
-        if (auto row = FindObject(store, configured); row && row->allocated) chosen = configured;
-        for (const auto& uuid : AllObjects(store)) {
-            if (auto row = FindObject(store, uuid); chosen.empty() && row->allocated) {
-                chosen = uuid;
-            }
-        }
+        chosen = ChooseDorna(store);
         if (chosen.empty()) throw HostCtlException("No suitable Dorna dump object found.");
         store.SetValue(kDornaKeys.active, chosen);
         store.JournalCall(kSmart, {chosen});

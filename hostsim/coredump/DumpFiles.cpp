@@ -402,19 +402,32 @@ void StorageInfoImpl::DeactivateDiagnosticFile() {
     BrixSim::Coredump::Mutate(kDeactivate, {}, [&](Store& s) { s.SetValue(kFileKeys.active, ""); });
 }
 
+namespace {
+
+// The configured file when it is usable, otherwise the first usable file found; "" when none.
+std::string ChooseFile(Store& store) {
+    const std::string configured = store.GetValue(kFileKeys.configured, "");
+    if (!configured.empty() && IsValidFile(store, configured, true)) return configured;
+    for (const auto& d : Datastores(store)) {
+        for (const auto& path : DumpFilesIn(store, d.name)) {
+            if (IsValidFile(store, path, true)) return path;
+        }
+    }
+    return "";
+}
+
+// At boot the host activates its dump file by the same choice.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](Store& store) { store.SetValue(kFileKeys.active, ChooseFile(store)); });
+
+}  // namespace
+
 std::unique_ptr<DiagnosticFile> StorageInfoImpl::SmartActivateDiagnosticFile() {
     auto& store = Store::Get();
     store.Check(kSmart);
     std::string chosen;
     store.Write([&] {
-        // The configured file when it is usable, otherwise the first usable file found.
-        const std::string configured = store.GetValue(kFileKeys.configured, "");
-        if (!configured.empty() && IsValidFile(store, configured, true)) chosen = configured;
-        for (const auto& d : Datastores(store)) {
-            for (const auto& path : DumpFilesIn(store, d.name)) {
-                if (chosen.empty() && IsValidFile(store, path, true)) chosen = path;
-            }
-        }
+        chosen = ChooseFile(store);
         if (chosen.empty()) throw HostCtlException("No suitable dump file found.");
         store.SetValue(kFileKeys.active, chosen);
         store.JournalCall(kSmart, {chosen});

@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 
 namespace BrixSim::Coredump {

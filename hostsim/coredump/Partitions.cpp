@@ -237,23 +237,36 @@ void StorageInfoImpl::DeactivateDiagnosticPartition() {
                               [&](Store& s) { s.SetValue(kPartitionKeys.active, ""); });
 }
 
+namespace {
+
+// The configured partition when it is usable; otherwise the first usable one on a local disk,
+// then the first usable one anywhere; "" when there is none.
+std::string ChoosePartition(Store& store) {
+    const std::string configured = store.GetValue(kPartitionKeys.configured, "");
+    if (auto p = FindPartition(store, configured); p && p->type == kCoreDumpType && p->online) {
+        return configured;
+    }
+    const auto candidates = CoreDumpPartitions(store);
+    for (bool wantLocal : {true, false}) {
+        for (const auto& p : candidates) {
+            if (p.online && (p.local || !wantLocal)) return p.name;
+        }
+    }
+    return "";
+}
+
+// At boot the host activates its dump partition by the same choice.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](Store& store) { store.SetValue(kPartitionKeys.active, ChoosePartition(store)); });
+
+}  // namespace
+
 std::unique_ptr<DiagnosticPartition> StorageInfoImpl::SmartActivateDiagnosticPartition() {
     auto& store = Store::Get();
     store.Check(kSmart);
     std::string chosen;
     store.Write([&] {
-        // The configured partition when it is usable; otherwise the first usable one on a
-        // local disk, then the first usable one anywhere.
-        const std::string configured = store.GetValue(kPartitionKeys.configured, "");
-        if (auto p = FindPartition(store, configured); p && p->type == kCoreDumpType && p->online) {
-            chosen = configured;
-        }
-        const auto candidates = CoreDumpPartitions(store);
-        for (bool wantLocal : {true, false}) {
-            for (const auto& p : candidates) {
-                if (chosen.empty() && p.online && (p.local || !wantLocal)) chosen = p.name;
-            }
-        }
+        chosen = ChoosePartition(store);
         if (chosen.empty()) throw HostCtlException("No suitable diagnostic partition found.");
         store.SetValue(kPartitionKeys.active, chosen);
         store.JournalCall(kSmart, {chosen});

@@ -12,6 +12,7 @@
 #include <system_error>
 #include <vector>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "identity/HostService.h"
@@ -115,6 +116,10 @@ void WriteMgmtCmd(const fs::path& root) {
     ::close(fd);
     fs::rename(temp, dir / "mgmt-cmd");
 }
+
+// The read cache runs as configured from the next boot on.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](BrixSim::Store& store) { store.Exec("UPDATE read_cache SET active = enabled_on_reboot"); });
 
 const bool registered = [] {
     BrixSim::RegisterOperations(

@@ -1,5 +1,6 @@
 // The kernel's access-control security domains: numbered slots (with gaps), each holding a named
 // domain and its enforcement level. Shared by the domain commands and the process labels.
+#include "core/Hooks.h"
 #include "core/Store.h"
 
 namespace {
@@ -23,5 +24,9 @@ const bool registered = BrixSim::RegisterTables({
         }
     },
 });
+
+// Levels set by hand hold for the running boot only; every domain boots enforcing.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](BrixSim::Store& store) { store.Exec("UPDATE secpolicy_domains SET level = 'enforcing'"); });
 
 }  // namespace

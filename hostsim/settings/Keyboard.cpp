@@ -3,6 +3,7 @@
 #include <string>
 #include <vector>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/SystemInfoImpl.h"
@@ -49,6 +50,10 @@ const bool registered = [] {
         },
     });
 }();
+
+// A layout loaded for the current boot only gives way to the stored one.
+const bool restarts = BrixSim::RegisterBootStep(
+    [](Store& store) { store.SetValue(kLoadedKey, store.GetValue(kStoredKey, kDefaultLayout)); });
 
 // The layout's name as the host spells it; names match without regard to case.
 std::string Known(Store& store, const std::string& name) {

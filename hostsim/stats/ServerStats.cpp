@@ -4,6 +4,7 @@
 
 #include <chrono>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 
 namespace {
@@ -28,13 +29,16 @@ const bool registered = [] {
         [](BrixSim::Store& store) {
             // Booted a little over three days ago, lightly loaded.
             const int64_t now = RealNowMicros();
-            store.Prepare(
-                     "INSERT INTO server_stats VALUES (1, ?, 3, 1, 37, 52, 48)")
+            store.Prepare("INSERT INTO server_stats VALUES (1, ?, 3, 1, 37, 52, 48)")
                 .Bind(1, now - 273'645'120'000LL)
                 .Run();
         },
     });
 }();
+
+const bool restarts = BrixSim::RegisterBootStep([](BrixSim::Store& store) {
+    store.Prepare("UPDATE server_stats SET boot_time_us = ?").Bind(1, RealNowMicros()).Run();
+});
 
 }  // namespace
 

@@ -106,6 +106,42 @@ TEST(Shutdown, RefusalsInOrder) {
     EXPECT_TRUE(mark.Added(kSteps).empty());
 }
 
+// The restarted host runs what is configured: uptime starts again, hand-set levels and
+// current-boot-only choices are gone, and the dump partition is chosen anew.
+TEST(Shutdown, RebootRestartsTheRunningState) {
+    for (const char* operation : {"reboot", "poweroff"}) {
+        SCOPED_TRACE(operation);
+        BrixTest::TempHost host;
+        EnterMaintenance(host);
+        for (const std::vector<std::string>& change : std::vector<std::vector<std::string>>{
+                 {"system", "secpolicy", "domain", "set", "-n", "shellTools", "-l", "audit"},
+                 {"system", "settings", "keyboard", "layout", "set", "-l", "German",
+                  "--no-persist"},
+                 {"system", "coredump", "partition", "set", "--unconfigure"}}) {
+            ASSERT_EQ(host.Cli(change).status, 0) << change[1];
+        }
+        const json dumpBefore = Parsed(Json(host, {"system", "coredump", "partition", "get"}));
+        ASSERT_EQ(dumpBefore["Active"], "");
+        ASSERT_GT(Parsed(Json(host, {"system", "stats", "uptime", "get"})).get<int64_t>(),
+                  86'400'000'000LL);
+
+        ASSERT_EQ(Parsed(Json(host, {"system", "shutdown", operation, "-r", "restart"})),
+                  json(true));
+        EXPECT_LT(Parsed(Json(host, {"system", "stats", "uptime", "get"})).get<int64_t>(),
+                  600'000'000LL);
+        for (const auto& domain : Parsed(Json(host, {"system", "secpolicy", "domain", "list"}))) {
+            EXPECT_EQ(domain["Enforcement Level"], "enforcing") << domain;
+        }
+        EXPECT_EQ(Parsed(Json(host, {"system", "settings", "keyboard", "layout", "get"})),
+                  json("US Default"));
+        const json dump = Parsed(Json(host, {"system", "coredump", "partition", "get"}));
+        EXPECT_EQ(dump["Active"], "naa.6000c2912f4e8a61:7");
+        EXPECT_EQ(dump["Configured"], "");
+        // Maintenance mode is kept across the restart.
+        EXPECT_EQ(Parsed(Json(host, {"system", "maintenanceMode", "get"})), json("Enabled"));
+    }
+}
+
 // A failing event library does not stop the shutdown.
 TEST(Shutdown, EventFailureIsIgnored) {
     for (const char* op : {"EvtUserLib_Init", "EvtUserLib_AddEvt"}) {
