@@ -14,6 +14,7 @@
 #include <string>
 
 #include "core/Registry.h"
+#include "os/HostFiles.h"
 
 namespace {
 
@@ -246,6 +247,18 @@ int unlink(const char* path) {
         });
         return error;
     });
+}
+
+// Host files the commands open themselves (secret files given by path) live under the root.
+std::string HostFileName(const std::string& path) {
+    try {
+        const auto resolved = BrixSim::Store::Get().Resolve(path);
+        if (resolved) return resolved->string();
+        errno = EACCES;
+    } catch (const std::exception&) {
+        errno = EIO;
+    }
+    return std::string();
 }
 
 }  // namespace HostOs
