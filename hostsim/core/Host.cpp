@@ -6,7 +6,8 @@
 
 namespace {
 
-const bool registered = BrixSim::RegisterOperations({"HostCtl::HostFactory::GetHost"});
+const bool registered =
+    BrixSim::RegisterOperations({"HostCtl::HostFactory::GetHost", "HostCtl::Host::GetSystemInfo"});
 
 }  // namespace
 
@@ -16,6 +17,7 @@ Host::Host() = default;
 Host::~Host() = default;
 
 std::unique_ptr<System::SystemInfo> Host::GetSystemInfo() {
+    BrixSim::Store::Get().Check("HostCtl::Host::GetSystemInfo");
     return std::make_unique<System::SystemInfo>();
 }
 
