@@ -5,6 +5,7 @@
 #include <sys/ioctl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <iostream>
 
@@ -20,7 +21,15 @@ struct Globals {
     std::string formatter;
     bool help = false;
     bool listCommands = false;
+    bool reference = false;
+    std::string completionShell;
 };
+
+std::string ShellList() {
+    std::string text;
+    for (const auto& shell : CompletionShells()) text += (text.empty() ? "" : ", ") + shell;
+    return text;
+}
 
 // Recognises a global option at args[i] (advancing i past a separate value). A command's own
 // option of the same name wins, so `spec` is consulted first when given.
@@ -32,6 +41,26 @@ bool TakeGlobal(const std::vector<std::string>& args, size_t& i, Globals& global
     }
     if (word == "--list-commands") {
         globals.listCommands = true;
+        return true;
+    }
+    if (word == "--reference") {
+        globals.reference = true;
+        return true;
+    }
+    if (word == "--completion" || word.rfind("--completion=", 0) == 0) {
+        std::string shell;
+        if (word.size() > 12) {
+            shell = word.substr(13);
+        } else if (i + 1 < args.size()) {
+            shell = args[++i];
+        } else {
+            throw UsageError("Error: Missing value for --completion (one of: " + ShellList() + ")");
+        }
+        const auto& shells = CompletionShells();
+        if (std::find(shells.begin(), shells.end(), shell) == shells.end()) {
+            throw UsageError("Error: Unknown shell " + shell + " (one of: " + ShellList() + ")");
+        }
+        globals.completionShell = shell;
         return true;
     }
     if (word == "--formatter" || word.rfind("--formatter=", 0) == 0) {
@@ -142,6 +171,15 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
 
     if (globals.help) {
         Detail::PrintHelp(*node, out);
+        return 0;
+    }
+    // Generated from the whole tree whatever the path: the script completes every path.
+    if (!globals.completionShell.empty()) {
+        WriteCompletionScript(*root, globals.completionShell, out);
+        return 0;
+    }
+    if (globals.reference) {
+        WriteReference(*node, out);
         return 0;
     }
     if (globals.listCommands) {

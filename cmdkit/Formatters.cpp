@@ -538,6 +538,12 @@ bool IsFormatterName(const std::string& name) {
            name == "csv" || name == "keyvalue";
 }
 
+const std::vector<std::string>& FormatterNames() {
+    static const std::vector<std::string> names = {"simple", "table", "json",
+                                                   "xml",    "csv",   "keyvalue"};
+    return names;
+}
+
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out) {
     if (formatter == "json") {

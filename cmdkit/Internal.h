@@ -5,6 +5,7 @@
 #include <map>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "cmdkit/AutoCli.h"
 
@@ -20,6 +21,11 @@ inline bool TakesValue(const CallSpec::ParameterSpec& parameter) {
     return parameter.GetType() != CallSpec::PARAM_FLAG;
 }
 
+// A parameter description with "%ENUM%" replaced by the enumeration's values, comma-separated,
+// and "%FULLENUM%" by each value with its description, each after `lineBreak`.
+std::string ExpandEnumPlaceholders(const CallSpec::ParameterSpec& parameter,
+                                   const std::string& description, const std::string& lineBreak);
+
 // The help of a namespace or command.
 void PrintHelp(AutoCli::NamespaceNode& node, std::ostream& out);
 
@@ -34,6 +40,8 @@ struct FormatContext {
 };
 
 bool IsFormatterName(const std::string& name);
+// Every formatter name, in the order the messages list them.
+const std::vector<std::string>& FormatterNames();
 // Writes `result` (non-null) with the named formatter.
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out);

@@ -22,4 +22,15 @@ std::shared_ptr<CallSpec::Input> ParseArguments(const CallSpec::InputSpec& spec,
 int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
            std::ostream& out, std::ostream& err);
 
+// The shells WriteCompletionScript knows, e.g. {"bash", "zsh"}.
+const std::vector<std::string>& CompletionShells();
+
+// Writes a self-contained completion script for `shell` (one of CompletionShells()) that
+// completes the paths, options and option values of the tree under `root` as it is now.
+void WriteCompletionScript(NamespaceNode& root, const std::string& shell, std::ostream& out);
+
+// Writes the Markdown reference of every path under `node`, in tree order: descriptions,
+// parameters and result fields.
+void WriteReference(NamespaceNode& node, std::ostream& out);
+
 }  // namespace CmdKit::AutoCli
