@@ -5,14 +5,17 @@
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 #include <stdlib.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <map>
 #include <set>
 #include <sstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "Robustness.h"
@@ -232,12 +235,8 @@ const std::vector<Expectation>& Expectations() {
          Report::Skipped},
         {"system coredump dorna list", "KernCtl::Storage::StorageInfoImpl::GetActive",
          Report::Skipped},
-        {"system coredump dorna remove -F",
-         "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove", Report::OwnMessage,
-         "Removal of object 3c9e7a41-5b2d-4f86-a1c0-7d84e2b9f615 failed"},
-        {"system coredump dorna remove -u",
-         "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove", Report::OwnMessage,
-         "Removal of object b81f04d6-2e7c-4a93-9d58-16fa0c3e72ab failed"},
+        {"system coredump dorna remove", "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove",
+         Report::OwnMessage, "Removal of object 3c9e7a41-5b2d-4f86-a1c0-7d84e2b9f615 failed"},
         {"system snmp set", "", Report::MessageAndResult},
         {"system snmp test", "", Report::MessageAndResult},
         {"system wbem set", "", Report::MessageAndResult},
@@ -279,14 +278,16 @@ bool StartsWith(const std::string& text, const std::string& start) {
     return text.compare(0, start.size(), start) == 0;
 }
 
-Expectation ExpectationFor(const std::string& line, const std::string& op) {
-    for (const auto& expectation : Expectations()) {
-        const std::string invocation = expectation.invocation;
+// The index of the first expectation that matches, or -1 for the plain message.
+int ExpectationFor(const std::string& line, const std::string& op) {
+    const auto& expectations = Expectations();
+    for (size_t i = 0; i < expectations.size(); ++i) {
+        const std::string invocation = expectations[i].invocation;
         if (!StartsWith(line + " ", invocation + " ")) continue;
-        if (!StartsWith(op, expectation.op)) continue;
-        return expectation;
+        if (!StartsWith(op, expectations[i].op)) continue;
+        return static_cast<int>(i);
     }
-    return {"", "", Report::Message};
+    return -1;
 }
 
 // What a run showed, in short: its exit status, its standard error and whether it printed a
@@ -322,20 +323,100 @@ std::string Expected(const Expectation& expectation, const std::string& message,
     return Summary(baseline);
 }
 
-// The sweep's hosts: one template, prepared once, and a work root reset from it per run.
+// Runs `work(item, worker)` for items 0..count-1 on `workers` threads.
+template <class Work>
+void InParallel(size_t count, size_t workers, const Work& work) {
+    std::atomic<size_t> next{0};
+    std::vector<std::thread> threads;
+    for (size_t worker = 0; worker < workers; ++worker) {
+        threads.emplace_back([&, worker] {
+            for (size_t item = next++; item < count; item = next++) work(item, worker);
+        });
+    }
+    for (auto& thread : threads) thread.join();
+}
+
+// Runs brixcli on the host at `root`, tracing its operations to `trace` when given. The
+// environment goes on the command line (through env) so that threads can run on their own
+// roots at once.
+RunResult RunOn(const fs::path& root, const std::string& line, const fs::path& trace = {}) {
+    std::vector<std::string> argv{"env", "BRIX_HOST_ROOT=" + root.string(),
+                                  "BRIXSIM_SLEEP_SCALE=0"};
+    if (!trace.empty()) argv.push_back("BRIXSIM_TRACE_OPS=" + trace.string());
+    argv.push_back(BrixRobust::Program("brixcli"));
+    for (auto& word : Words(line)) argv.push_back(word);
+    return BrixTest::Run(argv);
+}
+
+// Arms the fault straight in the store's table, without waiting for the disk: the sweep needs
+// no durability, and a flush per case would dominate its run time.
+bool Arm(const fs::path& root, const std::string& op, const std::string& message,
+         const std::string& detail) {
+    sqlite3* db = nullptr;
+    if (sqlite3_open((root / "host.db").c_str(), &db) != SQLITE_OK) {
+        sqlite3_close(db);
+        return false;
+    }
+    sqlite3_busy_timeout(db, 10000);
+    sqlite3_exec(db, "PRAGMA synchronous=OFF", nullptr, nullptr, nullptr);
+    sqlite3_stmt* insert = nullptr;
+    sqlite3_prepare_v2(db, "INSERT OR REPLACE INTO faults VALUES (?, ?, ?, NULL)", -1, &insert,
+                       nullptr);
+    sqlite3_bind_text(insert, 1, op.c_str(), -1, SQLITE_TRANSIENT);
+    sqlite3_bind_text(insert, 2, message.c_str(), -1, SQLITE_TRANSIENT);
+    sqlite3_bind_text(insert, 3, detail.c_str(), -1, SQLITE_TRANSIENT);
+    const int status = sqlite3_step(insert);
+    sqlite3_finalize(insert);
+    sqlite3_close(db);
+    return status == SQLITE_DONE;
+}
+
+// A sample's baseline run and the operations it reaches, in the order of their first call.
+struct Traced {
+    RunResult baseline;
+    std::vector<std::string> ops;
+    std::string failure;  // a setup that did not work
+};
+
+// One (command, operation) pair with the fault armed.
+struct FaultCase {
+    size_t sample;
+    std::string op;
+    int expectation;
+    std::string message, detail;
+    RunResult run;
+    std::string failure;
+};
+
+// The sweep's hosts: a template prepared once, and one work root per thread, reset from the
+// template before every run.
 class FaultSweep : public ::testing::Test {
   protected:
     void SetUp() override {
         Prepare(host_);
-        templateRoot_ = host_.Root().string() + ".template";
+        // The runs need no durability: on a memory file system their flushes cost nothing.
+        const char* tmp = getenv("TMPDIR");
+        std::string pattern = access("/dev/shm", W_OK) == 0 ? "/dev/shm"
+                              : tmp && *tmp                 ? tmp
+                                                            : "/tmp";
+        pattern += "/brixsweep-XXXXXX";
+        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
+        scratch_ = pattern;
+        templateRoot_ = scratch_ / "template";
         BrixRobust::CopyTree(host_.Root(), templateRoot_);
-        trace_ = host_.Root().string() + ".trace";
+        workers_ = static_cast<size_t>(BrixRobust::EnvCount(
+            "BRIX_ROBUST_JOBS",
+            static_cast<int>(std::max(2u, std::thread::hardware_concurrency()))));
+        for (size_t i = 0; i < workers_; ++i) {
+            const fs::path root = scratch_ / ("w" + std::to_string(i));
+            fs::create_directories(root);
+            roots_.push_back(root);
+            traces_.push_back(root.string() + ".trace");
+        }
     }
     void TearDown() override {
         std::error_code ignored;
-        fs::remove_all(templateRoot_, ignored);
-        fs::remove(trace_, ignored);
-        unsetenv("BRIXSIM_TRACE_OPS");
+        if (!scratch_.empty()) fs::remove_all(scratch_, ignored);
     }
 
     static void Prepare(TempHost& host) {
@@ -355,54 +436,49 @@ class FaultSweep : public ::testing::Test {
         ASSERT_EQ(set.status, 0) << set.err;
     }
 
-    // Resets the work root and runs the setup lines.
-    void Reset(const Sample& sample) {
-        Store::Close();
-        BrixRobust::ResetRoot(host_.Root(), templateRoot_);
+    // Resets a worker's root and runs the sample's setup lines; the failure, if any.
+    std::string Reset(size_t worker, const Sample& sample) {
+        BrixRobust::ResetRoot(roots_[worker], templateRoot_);
         std::istringstream setup(sample.setup);
         for (std::string line; std::getline(setup, line, ';');) {
-            const auto result = host_.Cli(Words(line));
-            ASSERT_EQ(result.status, 0) << "setup " << line << ": " << result.err;
+            const auto result = RunOn(roots_[worker], line);
+            if (result.status != 0) return "setup " + line + ": " + result.err;
         }
+        return "";
     }
 
-    // The operations the sample reaches, in the order of their first call.
-    std::vector<std::string> Trace(const Sample& sample, RunResult& baseline) {
-        std::vector<std::string> ops;
-        Reset(sample);
-        fs::remove(trace_);
-        setenv("BRIXSIM_TRACE_OPS", trace_.c_str(), 1);
-        baseline = host_.Cli(Words(sample.line));
-        unsetenv("BRIXSIM_TRACE_OPS");
-        std::ifstream in(trace_);
+    Traced Trace(size_t worker, const Sample& sample) {
+        Traced traced;
+        traced.failure = Reset(worker, sample);
+        if (!traced.failure.empty()) return traced;
+        fs::remove(traces_[worker]);
+        traced.baseline = RunOn(roots_[worker], sample.line, traces_[worker]);
+        std::ifstream in(traces_[worker]);
         for (std::string op; std::getline(in, op);) {
-            if (std::find(ops.begin(), ops.end(), op) == ops.end()) ops.push_back(op);
+            if (std::find(traced.ops.begin(), traced.ops.end(), op) == traced.ops.end()) {
+                traced.ops.push_back(op);
+            }
         }
-        return ops;
+        return traced;
     }
 
-    // Arms the fault straight in the store's table, without waiting for the disk: the sweep
-    // needs no durability, and a flush per case would dominate its run time.
-    void Arm(const std::string& op, const std::string& message, const std::string& detail) {
-        sqlite3* db = nullptr;
-        ASSERT_EQ(sqlite3_open((host_.Root() / "host.db").c_str(), &db), SQLITE_OK);
-        sqlite3_busy_timeout(db, 10000);
-        sqlite3_exec(db, "PRAGMA synchronous=OFF", nullptr, nullptr, nullptr);
-        sqlite3_stmt* insert = nullptr;
-        sqlite3_prepare_v2(db, "INSERT OR REPLACE INTO faults VALUES (?, ?, ?, NULL)", -1, &insert,
-                           nullptr);
-        sqlite3_bind_text(insert, 1, op.c_str(), -1, SQLITE_TRANSIENT);
-        sqlite3_bind_text(insert, 2, message.c_str(), -1, SQLITE_TRANSIENT);
-        sqlite3_bind_text(insert, 3, detail.c_str(), -1, SQLITE_TRANSIENT);
-        const int status = sqlite3_step(insert);
-        sqlite3_finalize(insert);
-        sqlite3_close(db);
-        ASSERT_EQ(status, SQLITE_DONE);
+    void RunCase(size_t worker, FaultCase& item) {
+        const Sample& sample = Samples()[item.sample];
+        item.failure = Reset(worker, sample);
+        if (!item.failure.empty()) return;
+        if (!Arm(roots_[worker], item.op, item.message, item.detail)) {
+            item.failure = "cannot arm the fault";
+            return;
+        }
+        item.run = RunOn(roots_[worker], sample.line);
     }
 
     TempHost host_;
+    fs::path scratch_;
     fs::path templateRoot_;
-    fs::path trace_;
+    size_t workers_ = 2;
+    std::vector<fs::path> roots_;
+    std::vector<fs::path> traces_;
 };
 
 TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
@@ -430,36 +506,68 @@ TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
     std::istringstream opLines(opsRun.out);
     for (std::string op; std::getline(opLines, op);) allOps.insert(op);
 
+    // What every sample reaches.
+    const auto& samples = Samples();
+    std::vector<Traced> traced(samples.size());
+    InParallel(samples.size(), workers_,
+               [&](size_t i, size_t worker) { traced[i] = Trace(worker, samples[i]); });
+
+    // One case per command, operation and kind of report: samples of one command that reach
+    // an operation the same way need it armed once.
     std::set<std::string> reached;
-    int cases = 0;
-    for (const auto& sample : Samples()) {
-        SCOPED_TRACE(sample.line);
-        const auto words = Words(sample.line);
-        RunResult baseline;
-        const auto ops = Trace(sample, baseline);
-        EXPECT_LT(baseline.status, 2) << baseline.err;
-        for (const auto& op : ops) {
-            SCOPED_TRACE(op);
-            EXPECT_TRUE(allOps.count(op)) << "traced operation not in fault ops";
+    std::set<std::string> done;
+    std::vector<FaultCase> cases;
+    for (size_t i = 0; i < samples.size(); ++i) {
+        SCOPED_TRACE(samples[i].line);
+        ASSERT_EQ(traced[i].failure, "");
+        EXPECT_LT(traced[i].baseline.status, 2) << traced[i].baseline.err;
+        for (const auto& op : traced[i].ops) {
+            EXPECT_TRUE(allOps.count(op)) << op << " is traced but not in fault ops";
             reached.insert(op);
-            ++cases;
-            const std::string message = "Injected fault " + std::to_string(cases) + " of " + op;
-            const std::string detail = "detail " + std::to_string(cases);
-            Reset(sample);
-            Arm(op, message, detail);
-            const auto run = host_.Cli(words);
-            const auto expectation = ExpectationFor(sample.line, op);
-            if (expectation.report == Report::Skipped) {
-                // Exit 0 and no message, as the baseline, but a listing with fewer entries.
-                EXPECT_EQ(Summary(run.status, run.err, false), Summary(0, "", false));
-                EXPECT_NE(run.out, baseline.out) << "nothing was left out";
-            } else {
-                EXPECT_EQ(Summary(run), Expected(expectation, message, detail, baseline));
-            }
+            const int expectation = ExpectationFor(samples[i].line, op);
+            const std::string key =
+                CommandPath(Words(samples[i].line)) + "|" + op + "|" + std::to_string(expectation);
+            if (!done.insert(key).second) continue;
+            const std::string number = std::to_string(cases.size() + 1);
+            cases.push_back({i,
+                             op,
+                             expectation,
+                             "Injected fault " + number + " of " + op,
+                             "detail " + number,
+                             {},
+                             {}});
         }
     }
-    std::cerr << "fault sweep: " << Samples().size() << " invocations, " << cases << " cases\n";
 
+    InParallel(cases.size(), workers_, [&](size_t i, size_t worker) { RunCase(worker, cases[i]); });
+
+    std::set<int> used;
+    for (const auto& item : cases) {
+        SCOPED_TRACE(samples[item.sample].line + std::string(" with ") + item.op);
+        ASSERT_EQ(item.failure, "");
+        used.insert(item.expectation);
+        const auto& baseline = traced[item.sample].baseline;
+        const Expectation expectation = item.expectation < 0
+                                            ? Expectation{"", "", Report::Message}
+                                            : Expectations()[static_cast<size_t>(item.expectation)];
+        if (expectation.report == Report::Skipped) {
+            // Exit 0 and no message, as the baseline, but a listing with fewer entries.
+            EXPECT_EQ(Summary(item.run.status, item.run.err, false), Summary(0, "", false));
+            EXPECT_NE(item.run.out, baseline.out) << "nothing was left out";
+        } else {
+            EXPECT_EQ(Summary(item.run),
+                      Expected(expectation, item.message, item.detail, baseline));
+        }
+    }
+    std::cerr << "fault sweep: " << samples.size() << " invocations, " << cases.size()
+              << " cases on " << workers_ << " threads\n";
+
+    // The tables hold nothing stale.
+    for (size_t i = 0; i < Expectations().size(); ++i) {
+        EXPECT_TRUE(used.count(static_cast<int>(i)))
+            << "expectation for " << Expectations()[i].invocation << " " << Expectations()[i].op
+            << " matches no case";
+    }
     // Every operation is reached, or listed with the reason why not.
     for (const auto& op : allOps) {
         if (reached.count(op)) {
