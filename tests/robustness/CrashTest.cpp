@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <chrono>
 #include <filesystem>
+#include <fstream>
 #include <functional>
 #include <nlohmann/json.hpp>
 #include <pugixml.hpp>
@@ -195,6 +196,23 @@ void KillWhileCommitting(const ChangeKind& kind, int kills, unsigned seed) {
     EXPECT_EQ(code, 0);
     EXPECT_EQ(kind.read(host), version);
     EXPECT_EQ(StrayTemporaries(host), 0);
+}
+
+// Temporaries of writers killed before their rename go with the next commit; other files that
+// merely look alike stay.
+TEST(Crash, CommitRemovesTemporariesOfKilledWriters) {
+    TempHost host;
+    ASSERT_EQ(host.Cli({"system", "uuid", "get"}).status, 0);  // seeds the host
+    const fs::path folder = host.Root() / "etc/ostrel";
+    for (const char* name : {"snmp.xml.Ab3dE9", "snmp.xml.000000", "snmp.xml.bak"}) {
+        std::ofstream(folder / name) << "<snmpAgent>";
+    }
+    const auto set = host.Cli({"system", "snmp", "set", "--syslocation", "hall-1"});
+    ASSERT_EQ(set.status, 0) << set.err;
+    EXPECT_FALSE(fs::exists(folder / "snmp.xml.Ab3dE9"));
+    EXPECT_FALSE(fs::exists(folder / "snmp.xml.000000"));
+    EXPECT_TRUE(fs::exists(folder / "snmp.xml.bak"));
+    EXPECT_EQ(StrayTemporaries(host), 1);  // the look-alike
 }
 
 int KillsPerKind() {
