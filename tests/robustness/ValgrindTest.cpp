@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <ostream>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -40,6 +41,11 @@ struct Case {
     int status;            // the command's own exit status
     const char* err = "";  // its whole standard error
 };
+
+// Names the case in test listings.
+void PrintTo(const Case& item, std::ostream* out) {
+    *out << item.line;
+}
 
 class Valgrind : public ::testing::TestWithParam<Case> {};
 
