@@ -1,6 +1,7 @@
 // The simulated host's store: one SQLite database (WAL, durable commits) under the host root.
 #include "core/Store.h"
 
+#include <fcntl.h>
 #include <sqlite3.h>
 #include <unistd.h>
 
@@ -99,6 +100,18 @@ void ExecRaw(sqlite3* db, std::string_view sql) {
         sqlite3_free(error);
         throw std::runtime_error("host store: " + message);
     }
+}
+
+// With BRIXSIM_TRACE_OPS naming a file, every checked operation is appended to it, one name a
+// line; tests learn from it which operations a command reaches.
+void TraceOperation(std::string_view operation) {
+    const char* trace = getenv("BRIXSIM_TRACE_OPS");
+    if (!trace || !*trace) return;
+    const int fd = open(trace, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644);
+    if (fd < 0) return;
+    const std::string line = std::string(operation) + "\n";
+    [[maybe_unused]] const ssize_t wrote = write(fd, line.data(), line.size());
+    close(fd);
 }
 
 void DecrementFault(Store& store, const std::string& operation) {
@@ -352,6 +365,7 @@ std::optional<fs::path> Store::Resolve(std::string_view hostPath) const {
 }
 
 void Store::Check(std::string_view operation) {
+    TraceOperation(operation);
     {
         auto fault = Prepare("SELECT message, detail, remaining FROM faults WHERE op = ?");
         fault.Bind(1, operation);

@@ -137,6 +137,7 @@ void DnsConfigImpl::SetHostname(const std::string& hostname, bool saveNow) {
     CheckHostname(hostname);
     CheckLength(hostname, domain_);
     hostname_ = hostname;
+    hostnameChanged_ = true;
     if (saveNow) SaveConfig();
 }
 
@@ -146,6 +147,7 @@ void DnsConfigImpl::SetDomain(const std::string& domain, bool saveNow) {
     CheckDomain(name);
     CheckLength(hostname_, name);
     domain_ = name;
+    domainChanged_ = true;
     if (saveNow) SaveConfig();
 }
 
@@ -165,6 +167,7 @@ void DnsConfigImpl::SetFqdn(const std::string& fqdn, bool saveNow,
     CheckLength(hostname, domain);
     hostname_ = hostname;
     domain_ = domain;
+    hostnameChanged_ = domainChanged_ = true;
     if (saveNow) SaveConfig();
 }
 
@@ -172,6 +175,17 @@ void DnsConfigImpl::SaveConfig() {
     auto& store = BrixSim::Store::Get();
     store.Check(kSave);
     store.Write([&] {
+        // The names as stored now, with this object's changes applied: another process may
+        // have saved the other name since this object read them.
+        {
+            auto row = store.Prepare("SELECT hostname, domain FROM dns_config WHERE stack = ?");
+            row.Bind(1, stack_);
+            if (row.Step()) {
+                if (!hostnameChanged_) hostname_ = row.Text(0);
+                if (!domainChanged_) domain_ = row.Text(1);
+            }
+        }
+        CheckLength(hostname_, domain_);
         auto update =
             store.Prepare("UPDATE dns_config SET hostname = ?, domain = ? WHERE stack = ?");
         update.Bind(1, hostname_).Bind(2, domain_).Bind(3, stack_).Run();

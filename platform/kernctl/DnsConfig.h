@@ -32,13 +32,16 @@ class DnsConfigImpl {
     // `defaultDomain` as its domain (empty: no domain).
     void SetFqdn(const std::string& fqdn, bool saveNow, const std::string& defaultDomain);
 
-    // Writes the changed configuration to the host; nothing reaches the host before.
+    // Writes the changed configuration to the host; nothing reaches the host before. Only
+    // what this object changed is written, so a concurrent change of the other name stays.
     void SaveConfig();
 
   private:
     std::string stack_;
     std::string hostname_;
     std::string domain_;
+    bool hostnameChanged_ = false;
+    bool domainChanged_ = false;
 };
 
 }  // namespace KernCtl::Network

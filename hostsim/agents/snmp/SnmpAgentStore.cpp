@@ -134,6 +134,21 @@ class StagedFile {
     bool published_ = false;
 };
 
+// Removes the staged copies of `target` ("<name>.XXXXXX") that writers killed before publishing
+// left behind. Only writers holding the configuration lock stage copies, so under that lock
+// every copy found is stale.
+void RemoveStaleCopies(const fs::path& target) {
+    const std::string prefix = target.filename().string() + ".";
+    constexpr size_t kSuffixLength = 6;  // mkostemp's XXXXXX
+    std::error_code ignored;
+    for (const auto& entry : fs::directory_iterator(target.parent_path(), ignored)) {
+        const std::string name = entry.path().filename().string();
+        if (name.size() == prefix.size() + kSuffixLength && name.rfind(prefix, 0) == 0) {
+            unlink(entry.path().c_str());
+        }
+    }
+}
+
 // Held while a writer reads, merges and replaces the configuration file.
 class ExclusiveLock {
   public:
@@ -264,6 +279,7 @@ class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
     void Commit() override {
         auto& store = Begin(kCommit);
         ExclusiveLock lock(HostFile(store, kLockPath));
+        RemoveStaleCopies(HostFile(store, kConfigPath));
         const Stored stored = ReadStored(store);
         if (!stored.wellFormed && !reset_) throw HostCtlException(kNotValid);
         const Snmp::Settings base = reset_ ? Snmp::FactoryDefaults() : loaded_;
