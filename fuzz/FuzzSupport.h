@@ -22,9 +22,9 @@ namespace BrixFuzz {
     std::abort();
 }
 
-#define BRIX_FUZZ_CHECK(condition, detail)                          \
-    do {                                                            \
-        if (!(condition)) ::BrixFuzz::Fail(#condition, (detail));   \
+#define BRIX_FUZZ_CHECK(condition, detail)                        \
+    do {                                                          \
+        if (!(condition)) ::BrixFuzz::Fail(#condition, (detail)); \
     } while (false)
 
 inline std::string_view Text(const uint8_t* data, size_t size) {

@@ -41,20 +41,17 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     BRIX_FUZZ_CHECK(options->permissions >= 0 && options->permissions <= 07777, text);
     BRIX_FUZZ_CHECK(ValidName(options->name), text);
     // The options written back as mount data read the same.
-    const std::string again = std::to_string(options->reservedMib) + "," +
-                              std::to_string(options->maxMib) + "," +
-                              std::to_string(options->reservedInodes) + "," +
-                              std::to_string(options->maxInodes) + "," +
-                              (options->coredump ? "1" : "0") + "," +
-                              Octal(options->permissions) + "," + options->name;
+    const std::string again =
+        std::to_string(options->reservedMib) + "," + std::to_string(options->maxMib) + "," +
+        std::to_string(options->reservedInodes) + "," + std::to_string(options->maxInodes) + "," +
+        (options->coredump ? "1" : "0") + "," + Octal(options->permissions) + "," + options->name;
     const auto reparsed = BrixSim::Quillfs::ParseMountData(again);
-    BRIX_FUZZ_CHECK(reparsed && reparsed->reservedMib == options->reservedMib &&
-                        reparsed->maxMib == options->maxMib &&
-                        reparsed->reservedInodes == options->reservedInodes &&
-                        reparsed->maxInodes == options->maxInodes &&
-                        reparsed->coredump == options->coredump &&
-                        reparsed->permissions == options->permissions &&
-                        reparsed->name == options->name,
-                    text + " -> " + again);
+    BRIX_FUZZ_CHECK(
+        reparsed && reparsed->reservedMib == options->reservedMib &&
+            reparsed->maxMib == options->maxMib &&
+            reparsed->reservedInodes == options->reservedInodes &&
+            reparsed->maxInodes == options->maxInodes && reparsed->coredump == options->coredump &&
+            reparsed->permissions == options->permissions && reparsed->name == options->name,
+        text + " -> " + again);
     return 0;
 }

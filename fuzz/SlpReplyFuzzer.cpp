@@ -26,9 +26,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const auto reply = ParseReply(bytes.get(), size);
     if (!reply) return 0;
     BRIX_FUZZ_CHECK(length && *length <= size && *length >= kHeaderFixedSize, "");
-    BRIX_FUZZ_CHECK(reply->function == kSrvRply || reply->function == kSAAdvert ||
-                        reply->function == kDAAdvert,
-                    std::to_string(reply->function));
+    BRIX_FUZZ_CHECK(
+        reply->function == kSrvRply || reply->function == kSAAdvert || reply->function == kDAAdvert,
+        std::to_string(reply->function));
     BRIX_FUZZ_CHECK(Displayable(reply->language), reply->language);
     if (reply->errorCode != 0) {
         BRIX_FUZZ_CHECK(reply->entries.empty(), "an error reply with entries");
@@ -40,8 +40,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     }
     // Bytes after the message's own length do not change the answer.
     const auto alone = ParseReply(bytes.get(), *length);
-    BRIX_FUZZ_CHECK(alone && alone->entries.size() == reply->entries.size() &&
-                        alone->xid == reply->xid,
-                    "trailing bytes changed the reply");
+    BRIX_FUZZ_CHECK(
+        alone && alone->entries.size() == reply->entries.size() && alone->xid == reply->xid,
+        "trailing bytes changed the reply");
     return 0;
 }
