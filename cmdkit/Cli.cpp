@@ -122,7 +122,7 @@ std::string ChildList(const NamespaceNode& node) {
 }
 
 int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
-        std::ostream& out, std::ostream& err) {
+        std::ostream& out, std::ostream& err, bool execute) {
     Globals globals;
     size_t i = 0;
     // Global options before the path.
@@ -219,6 +219,7 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
 
     auto& command = dynamic_cast<Command&>(*node);
     auto input = ParseArguments(*spec, rest);
+    if (!execute) return 0;
     for (const auto& context : spec->GetSupportedContexts()) {
         if (context == "user") input->SetContext("user", LoginName());
     }
@@ -250,13 +251,12 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
     return output->GetErrorMessages().empty() ? 0 : 1;
 }
 
-}  // namespace
-
-int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
-           std::ostream& out, std::ostream& err) {
+// RunCli and DryRunCli: the framework's refusals exit with 2, any other failure with 1.
+int Guarded(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
+            std::ostream& out, std::ostream& err, bool execute) {
     try {
         if (!root) throw CmdKitException("No command tree");
-        return Run(root, args, out, err);
+        return Run(root, args, out, err, execute);
     } catch (const UsageError& error) {
         err << error.what() << '\n';
         return 2;
@@ -264,6 +264,18 @@ int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::st
         err << "Error: " << error.what() << '\n';
         return 1;
     }
+}
+
+}  // namespace
+
+int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
+           std::ostream& out, std::ostream& err) {
+    return Guarded(root, args, out, err, true);
+}
+
+int DryRunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
+              std::ostream& out, std::ostream& err) {
+    return Guarded(root, args, out, err, false);
 }
 
 }  // namespace CmdKit::AutoCli

@@ -1,5 +1,6 @@
-// Mounting and unmounting Quillfs RAM disks. The mount data string is
-// "min-MiB,max-MiB,reserved-inodes,max-inodes,coredump,mode,name", e.g. "32,64,0,0,0,0755,r1".
+// Mounting and unmounting Quillfs RAM disks.
+#include "memfs/QuillfsMount.h"
+
 #include <algorithm>
 #include <boost/algorithm/string/classification.hpp>
 #include <boost/algorithm/string/split.hpp>
@@ -27,16 +28,6 @@ constexpr int64_t kInodeChunk = 128;
 constexpr size_t kMaxMountPoint = 131;
 constexpr size_t kMaxName = 63;
 
-struct RamdiskOptions {
-    int64_t reservedMib = 0;
-    int64_t maxMib = 0;
-    int64_t reservedInodes = 0;
-    int64_t maxInodes = 0;
-    bool coredump = false;
-    int64_t permissions = 0;
-    std::string name;
-};
-
 // A decimal (or, with base 8, octal) number of at most `max`, digits only.
 std::optional<int64_t> Number(const std::string& text, int base, int64_t max) {
     if (text.empty() || text.size() > 12) return std::nullopt;
@@ -60,7 +51,10 @@ bool ValidName(const std::string& name) {
     return name != "." && name != "..";
 }
 
-std::optional<RamdiskOptions> ParseOptions(const std::string& data) {
+}  // namespace
+
+std::optional<BrixSim::Quillfs::RamdiskOptions> BrixSim::Quillfs::ParseMountData(
+    const std::string& data) {
     std::vector<std::string> fields;
     boost::algorithm::split(fields, data, boost::algorithm::is_any_of(","));
     if (fields.size() != 7) return std::nullopt;
@@ -83,6 +77,8 @@ std::optional<RamdiskOptions> ParseOptions(const std::string& data) {
     if (options.reservedInodes > options.maxInodes) return std::nullopt;
     return options;
 }
+
+namespace {
 
 // The host path as the kernel names the mount: absolute, normalised, no trailing slash.
 std::string MountPoint(const std::string& target) {
@@ -111,7 +107,7 @@ int Mount(const std::string&, const std::string& target, unsigned long, const st
             result = EBUSY;
             return;
         }
-        const auto options = ParseOptions(data);
+        const auto options = BrixSim::Quillfs::ParseMountData(data);
         if (!options) {
             result = EINVAL;
             return;

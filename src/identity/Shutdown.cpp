@@ -18,17 +18,6 @@ static_assert(SIGTERM == 15 && SIGUSR2 == 12 && LOG_CRIT == 2);
 // The pause between logging the reason and signalling init.
 constexpr time_t kLogPause = 10;
 
-// `text` as a printf format that prints it literally.
-std::string LiteralFormat(const std::string& text) {
-    std::string format;
-    format.reserve(text.size());
-    for (char c : text) {
-        if (c == '%') format += '%';
-        format += c;
-    }
-    return format;
-}
-
 }  // namespace
 
 bool Shutdown::_operationInProgress = false;
@@ -75,8 +64,8 @@ void Shutdown::LogMsgEvt(const std::string& text) {
 }
 
 void Shutdown::LogMsgSyslog(const std::string& text) {
-    // The text is the record's format; a '%' in the user's reason must print as itself.
-    HostOs::syslog(LOG_CRIT, LiteralFormat(text).c_str());
+    // The record is the text as given: a '%' in the user's reason prints as itself.
+    HostOs::syslog(LOG_CRIT, "%s", text.c_str());
 }
 
 void Shutdown::LogReason(const std::string& reason) {

@@ -1,6 +1,5 @@
 // brixsim: makes and seeds a simulated host, arms faults, reads the journal, exports and imports
 // the host's state, and switches feature entries.
-#include <sqlite3.h>
 #include <stdlib.h>
 
 #include <algorithm>
@@ -8,16 +7,15 @@
 #include <fstream>
 #include <iostream>
 #include <iterator>
-#include <map>
 #include <nlohmann/json.hpp>
 #include <optional>
-#include <set>
 #include <sstream>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "core/Registry.h"
+#include "core/StateTransfer.h"
 #include "core/Store.h"
 
 namespace {
@@ -49,15 +47,6 @@ constexpr const char* kUsage =
 struct UsageError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
-
-std::string Quote(const std::string& identifier) {
-    std::string quoted = "\"";
-    for (char c : identifier) {
-        quoted += c;
-        if (c == '"') quoted += '"';
-    }
-    return quoted + "\"";
-}
 
 int64_t ParseInt(const std::string& text, const std::string& what) {
     size_t used = 0;
@@ -206,92 +195,10 @@ int Journal(const Args& args) {
     return 0;
 }
 
-// Tables that export and import carry: all but SQLite's own and the store's bookkeeping.
-std::vector<std::string> StateTables(BrixSim::Store& store) {
-    std::vector<std::string> names;
-    auto rows = store.Prepare(
-        "SELECT name FROM sqlite_master WHERE type = 'table' AND name NOT LIKE 'sqlite\\_%' "
-        "ESCAPE '\\' AND name <> 'meta' ORDER BY name");
-    while (rows.Step()) names.push_back(rows.Text(0));
-    return names;
-}
-
-std::vector<std::string> Columns(BrixSim::Store& store, const std::string& table) {
-    std::vector<std::string> columns;
-    auto rows = store.Prepare("SELECT name FROM pragma_table_info(?) ORDER BY cid");
-    rows.Bind(1, table);
-    while (rows.Step()) columns.push_back(rows.Text(0));
-    return columns;
-}
-
 int Export(const Args& args) {
     if (!args.empty()) throw UsageError("export: unexpected argument " + args[0]);
-    auto& store = BrixSim::Store::Get();
-    nlohmann::ordered_json document;
-    document["version"] = 1;
-    auto& tables = document["tables"] = nlohmann::ordered_json::object();
-    // One read transaction, so the document is a consistent snapshot.
-    store.Exec("BEGIN");
-    try {
-        for (const auto& table : StateTables(store)) {
-            auto& rows = tables[table] = nlohmann::ordered_json::array();
-            sqlite3_stmt* stmt = nullptr;
-            const std::string sql = "SELECT * FROM " + Quote(table);
-            if (sqlite3_prepare_v2(store.Db(), sql.c_str(), -1, &stmt, nullptr) != SQLITE_OK) {
-                throw std::runtime_error(sqlite3_errmsg(store.Db()));
-            }
-            int rc;
-            while ((rc = sqlite3_step(stmt)) == SQLITE_ROW) {
-                nlohmann::ordered_json row = nlohmann::ordered_json::object();
-                for (int column = 0; column < sqlite3_column_count(stmt); ++column) {
-                    const std::string name = sqlite3_column_name(stmt, column);
-                    switch (sqlite3_column_type(stmt, column)) {
-                        case SQLITE_INTEGER:
-                            row[name] = static_cast<int64_t>(sqlite3_column_int64(stmt, column));
-                            break;
-                        case SQLITE_FLOAT:
-                            row[name] = sqlite3_column_double(stmt, column);
-                            break;
-                        case SQLITE_NULL:
-                            row[name] = nullptr;
-                            break;
-                        default:
-                            row[name] = std::string(
-                                reinterpret_cast<const char*>(sqlite3_column_text(stmt, column)),
-                                static_cast<size_t>(sqlite3_column_bytes(stmt, column)));
-                    }
-                }
-                rows.push_back(std::move(row));
-            }
-            sqlite3_finalize(stmt);
-            if (rc != SQLITE_DONE) throw std::runtime_error(sqlite3_errmsg(store.Db()));
-        }
-    } catch (...) {
-        store.Exec("ROLLBACK");
-        throw;
-    }
-    store.Exec("COMMIT");
-    std::cout << document.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace)
-              << "\n";
+    std::cout << BrixSim::ExportState(BrixSim::Store::Get()) << "\n";
     return 0;
-}
-
-void BindJson(sqlite3* db, sqlite3_stmt* stmt, int index, const nlohmann::json& value) {
-    int rc = SQLITE_OK;
-    if (value.is_null()) {
-        rc = sqlite3_bind_null(stmt, index);
-    } else if (value.is_boolean()) {
-        rc = sqlite3_bind_int64(stmt, index, value.get<bool>() ? 1 : 0);
-    } else if (value.is_number_integer()) {
-        rc = sqlite3_bind_int64(stmt, index, value.get<int64_t>());
-    } else if (value.is_number_float()) {
-        rc = sqlite3_bind_double(stmt, index, value.get<double>());
-    } else {
-        const auto& text = value.get_ref<const std::string&>();
-        rc = sqlite3_bind_text(stmt, index, text.data(), static_cast<int>(text.size()),
-                               SQLITE_TRANSIENT);
-    }
-    if (rc != SQLITE_OK) throw std::runtime_error(sqlite3_errmsg(db));
 }
 
 int Import(const Args& args) {
@@ -307,99 +214,18 @@ int Import(const Args& args) {
         }
         text.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
-    nlohmann::json document;
-    try {
-        document = nlohmann::json::parse(text);
-    } catch (const nlohmann::json::exception& e) {
-        std::cerr << "brixsim: " << args[0] << " is not JSON: " << e.what() << "\n";
-        return 1;
+    const auto result = BrixSim::ImportState(text, BrixSim::Store::Get);
+    switch (result.status) {
+        case BrixSim::ImportResult::Status::Applied:
+            return 0;
+        case BrixSim::ImportResult::Status::NotJson:
+            std::cerr << "brixsim: " << args[0] << " is not JSON: " << result.message << "\n";
+            return 1;
+        case BrixSim::ImportResult::Status::Refused:
+            break;
     }
-
-    auto invalid = [](const std::string& message) {
-        std::cerr << "brixsim: import refused, nothing changed: " << message << "\n";
-        return 1;
-    };
-    if (!document.is_object()) return invalid("the document is not a JSON object");
-    if (!document.contains("version") || document["version"] != 1) {
-        return invalid("\"version\" must be 1");
-    }
-    if (!document.contains("tables") || !document["tables"].is_object()) {
-        return invalid("\"tables\" must be an object");
-    }
-    auto& store = BrixSim::Store::Get();
-    const auto known = StateTables(store);
-    std::map<std::string, std::set<std::string>> columns;
-    for (const auto& [table, rows] : document["tables"].items()) {
-        if (!std::binary_search(known.begin(), known.end(), table)) {
-            return invalid("unknown table \"" + table + "\"");
-        }
-        const auto names = Columns(store, table);
-        columns[table] = {names.begin(), names.end()};
-        if (!rows.is_array()) return invalid("table \"" + table + "\" is not an array of rows");
-        size_t index = 0;
-        for (const auto& row : rows) {
-            const std::string where = "table \"" + table + "\" row " + std::to_string(index++);
-            if (!row.is_object()) return invalid(where + " is not an object");
-            for (const auto& [column, value] : row.items()) {
-                if (!columns[table].count(column)) {
-                    return invalid(where + ": unknown column \"" + column + "\"");
-                }
-                if (value.is_object() || value.is_array() || value.is_binary()) {
-                    return invalid(where + " column \"" + column + "\": not a scalar value");
-                }
-                if (value.is_number_unsigned() &&
-                    value.get<uint64_t>() > static_cast<uint64_t>(INT64_MAX)) {
-                    return invalid(where + " column \"" + column + "\": integer out of range");
-                }
-            }
-        }
-    }
-    try {
-        store.Write([&] {
-            // Tables are replaced one after another; references between them are checked
-            // once all are in place.
-            store.Exec("PRAGMA defer_foreign_keys=ON");
-            for (const auto& [table, rows] : document["tables"].items()) {
-                store.Exec("DELETE FROM " + Quote(table));
-                for (const auto& row : rows) {
-                    std::string names, marks;
-                    for (const auto& [column, value] : row.items()) {
-                        (void)value;
-                        names += (names.empty() ? "" : ", ") + Quote(column);
-                        marks += marks.empty() ? "?" : ", ?";
-                    }
-                    const std::string sql = row.empty()
-                                                ? "INSERT INTO " + Quote(table) + " DEFAULT VALUES"
-                                                : "INSERT INTO " + Quote(table) + " (" + names +
-                                                      ") VALUES (" + marks + ")";
-                    sqlite3_stmt* stmt = nullptr;
-                    if (sqlite3_prepare_v2(store.Db(), sql.c_str(), -1, &stmt, nullptr) !=
-                        SQLITE_OK) {
-                        throw std::runtime_error(sqlite3_errmsg(store.Db()));
-                    }
-                    int index = 1;
-                    try {
-                        for (const auto& [column, value] : row.items()) {
-                            (void)column;
-                            BindJson(store.Db(), stmt, index++, value);
-                        }
-                    } catch (...) {
-                        sqlite3_finalize(stmt);
-                        throw;
-                    }
-                    const int rc = sqlite3_step(stmt);
-                    const std::string error = sqlite3_errmsg(store.Db());
-                    sqlite3_finalize(stmt);
-                    if (rc != SQLITE_DONE) {
-                        throw std::runtime_error("table \"" + table + "\": " + error);
-                    }
-                }
-            }
-        });
-    } catch (const std::runtime_error& e) {
-        return invalid(e.what());
-    }
-    return 0;
+    std::cerr << "brixsim: import refused, nothing changed: " << result.message << "\n";
+    return 1;
 }
 
 int Feature(const Args& args) {

@@ -453,7 +453,13 @@ std::string FormatSettings(const Settings& settings) {
     }
     std::ostringstream out;
     document.save(out, "  ");
-    return out.str();
+    // The writer leaves a carriage return in text as it is, and any reader turns a raw one into
+    // a line feed: write it as a character reference so that the value reads back unchanged.
+    std::string text = out.str();
+    for (size_t at = text.find('\r'); at != std::string::npos; at = text.find('\r', at)) {
+        text.replace(at, 1, "&#13;");
+    }
+    return text;
 }
 
 }  // namespace BrixSim::Snmp

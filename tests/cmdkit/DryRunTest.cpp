@@ -1,0 +1,86 @@
+// DryRunCli: everything RunCli does before a command runs, and never the command itself.
+#include <gtest/gtest.h>
+
+#include "FakeCommand.h"
+
+namespace CmdKitTest {
+namespace {
+
+struct DryRun {
+    int status = -1;
+    std::string out;
+    std::string err;
+};
+
+DryRun Dry(const std::shared_ptr<AutoCli::NamespaceNode>& root,
+           const std::vector<std::string>& args) {
+    std::ostringstream out;
+    std::ostringstream err;
+    DryRun run;
+    run.status = AutoCli::DryRunCli(root, args, out, err);
+    run.out = out.str();
+    run.err = err.str();
+    return run;
+}
+
+// A command that must never run: it takes a required integer in 1..9 and a flag.
+std::shared_ptr<FakeCommand> Guarded(bool& ran) {
+    auto spec = [] {
+        auto input = CallSpec::InputSpec::New();
+        auto level = Param("level", CallSpec::PARAM_INT, "l", true);
+        auto range = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
+        range->SetIntRange(1, 9);
+        level->SetConstraint(range);
+        input->AddParameter(level);
+        input->AddParameter(Param("force", CallSpec::PARAM_FLAG));
+        return input;
+    };
+    auto command = FakeCommand::New(spec, MetaObj::MetaBool::New(),
+                                    [&ran](CallSpec::Input&, CallSpec::Output& output) {
+                                        ran = true;
+                                        output.SetRootObject(MetaObj::MetaBool::New(true));
+                                    });
+    command->SetDescription("Change a level.");
+    return command;
+}
+
+TEST(DryRunCli, AnswersLikeRunCliUpToExecution) {
+    const std::vector<std::vector<std::string>> invocations = {
+        {"a", "b", "cmd", "--help"},
+        {"--list-commands", "--formatter=csv"},
+        {"a", "b", "cmd"},
+        {"a", "b", "cmd", "-l", "10"},
+        {"a", "b", "cmd", "-l", "x"},
+        {"a", "b", "cmd", "-l", "1", "--force=yes"},
+        {"a", "b", "cmd", "-l", "1", "--formatter=yaml"},
+        {"a", "zz"},
+        {"a", "b"},
+        {"--bogus"},
+    };
+    for (const auto& args : invocations) {
+        bool ran = false;
+        const auto dry = Dry(TreeWith(Guarded(ran)), args);
+        const auto real = Invoke(TreeWith(Guarded(ran)), args);
+        EXPECT_EQ(dry.status, real.status) << args.back();
+        EXPECT_EQ(dry.out, real.out) << args.back();
+        EXPECT_EQ(dry.err, real.err) << args.back();
+        EXPECT_FALSE(ran) << args.back();
+    }
+}
+
+TEST(DryRunCli, AcceptedInvocationDoesNotExecute) {
+    bool ran = false;
+    auto command = Guarded(ran);
+    const auto dry = Dry(TreeWith(command), {"a", "b", "cmd", "--level=3", "--force"});
+    EXPECT_EQ(dry.status, 0);
+    EXPECT_EQ(dry.out, "");
+    EXPECT_EQ(dry.err, "");
+    EXPECT_FALSE(ran);
+    EXPECT_EQ(command->lastInput, nullptr);
+
+    EXPECT_EQ(Invoke(TreeWith(command), {"a", "b", "cmd", "--level=3"}).out, "true\n");
+    EXPECT_TRUE(ran);
+}
+
+}  // namespace
+}  // namespace CmdKitTest
