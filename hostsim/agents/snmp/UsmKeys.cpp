@@ -1,5 +1,6 @@
 #include "agents/snmp/UsmKeys.h"
 
+#include <dlfcn.h>
 #include <openssl/evp.h>
 #include <openssl/hmac.h>
 #include <openssl/rand.h>
@@ -11,12 +12,57 @@ namespace BrixSim::Snmp {
 
 namespace {
 
+// libcrypto is loaded on first use: only the SNMP agent needs it, and loading it with every
+// library of the host (its few thousand symbols are bound at load) would slow down every command.
+struct Libcrypto {
+    explicit Libcrypto(void* library) : handle(library) {}
+
+    template <class Function>
+    Function Symbol(const char* name) const {
+        void* address = dlsym(handle, name);
+        if (!address) throw std::runtime_error(std::string("libcrypto has no ") + name);
+        return reinterpret_cast<Function>(address);
+    }
+
+    void* handle;
+#define BRIX_LIBCRYPTO_FUNCTION(name) \
+    const decltype(&::name) name = Symbol<decltype(&::name)>(#name)
+    BRIX_LIBCRYPTO_FUNCTION(EVP_md5);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_sha1);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_aes_128_cfb128);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_MD_CTX_new);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_MD_CTX_free);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_DigestInit_ex);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_DigestUpdate);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_DigestFinal_ex);
+    BRIX_LIBCRYPTO_FUNCTION(HMAC);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_CIPHER_CTX_new);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_CIPHER_CTX_free);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_CipherInit_ex);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_CipherUpdate);
+    BRIX_LIBCRYPTO_FUNCTION(EVP_CipherFinal_ex);
+    BRIX_LIBCRYPTO_FUNCTION(RAND_bytes);
+#undef BRIX_LIBCRYPTO_FUNCTION
+};
+
+const Libcrypto& Crypto() {
+    static const Libcrypto library = [] {
+        // Stays loaded for the life of the process.
+        void* handle = dlopen(BRIX_LIBCRYPTO_SONAME, RTLD_NOW | RTLD_LOCAL);
+        if (!handle) {
+            throw std::runtime_error(std::string("cannot load libcrypto: ") + dlerror());
+        }
+        return Libcrypto(handle);
+    }();
+    return library;
+}
+
 const EVP_MD* Digest(AuthProtocol protocol) {
     switch (protocol) {
         case AuthProtocol::Md5:
-            return EVP_md5();
+            return Crypto().EVP_md5();
         case AuthProtocol::Sha1:
-            return EVP_sha1();
+            return Crypto().EVP_sha1();
         case AuthProtocol::None:
             break;
     }
@@ -24,22 +70,23 @@ const EVP_MD* Digest(AuthProtocol protocol) {
 }
 
 struct DigestContext {
-    std::unique_ptr<EVP_MD_CTX, decltype(&EVP_MD_CTX_free)> context{EVP_MD_CTX_new(),
-                                                                    &EVP_MD_CTX_free};
+    const Libcrypto& crypto = Crypto();
+    std::unique_ptr<EVP_MD_CTX, decltype(&EVP_MD_CTX_free)> context{crypto.EVP_MD_CTX_new(),
+                                                                    crypto.EVP_MD_CTX_free};
     explicit DigestContext(AuthProtocol protocol) {
-        if (!context || EVP_DigestInit_ex(context.get(), Digest(protocol), nullptr) != 1) {
+        if (!context || crypto.EVP_DigestInit_ex(context.get(), Digest(protocol), nullptr) != 1) {
             throw std::runtime_error("digest initialisation failed");
         }
     }
     void Update(std::string_view bytes) {
-        if (EVP_DigestUpdate(context.get(), bytes.data(), bytes.size()) != 1) {
+        if (crypto.EVP_DigestUpdate(context.get(), bytes.data(), bytes.size()) != 1) {
             throw std::runtime_error("digest update failed");
         }
     }
     std::string Final() {
         unsigned char out[EVP_MAX_MD_SIZE];
         unsigned int size = 0;
-        if (EVP_DigestFinal_ex(context.get(), out, &size) != 1) {
+        if (crypto.EVP_DigestFinal_ex(context.get(), out, &size) != 1) {
             throw std::runtime_error("digest failed");
         }
         return std::string(reinterpret_cast<char*>(out), size);
@@ -88,8 +135,9 @@ std::string LocalizedKey(AuthProtocol protocol, std::string_view password,
 std::string Hmac96(AuthProtocol protocol, std::string_view key, std::string_view message) {
     unsigned char out[EVP_MAX_MD_SIZE];
     unsigned int size = 0;
-    if (!HMAC(Digest(protocol), key.data(), static_cast<int>(key.size()),
-              reinterpret_cast<const unsigned char*>(message.data()), message.size(), out, &size) ||
+    if (!Crypto().HMAC(Digest(protocol), key.data(), static_cast<int>(key.size()),
+                       reinterpret_cast<const unsigned char*>(message.data()), message.size(), out,
+                       &size) ||
         size < 12) {
         throw std::runtime_error("HMAC failed");
     }
@@ -99,21 +147,22 @@ std::string Hmac96(AuthProtocol protocol, std::string_view key, std::string_view
 std::string AesCfb128(bool encrypt, std::string_view key, std::string_view iv,
                       std::string_view data) {
     if (key.size() < 16 || iv.size() != 16) throw std::invalid_argument("bad AES key or IV");
-    std::unique_ptr<EVP_CIPHER_CTX, decltype(&EVP_CIPHER_CTX_free)> context(EVP_CIPHER_CTX_new(),
-                                                                            &EVP_CIPHER_CTX_free);
+    const Libcrypto& crypto = Crypto();
+    std::unique_ptr<EVP_CIPHER_CTX, decltype(&EVP_CIPHER_CTX_free)> context(
+        crypto.EVP_CIPHER_CTX_new(), crypto.EVP_CIPHER_CTX_free);
     std::string out(data.size() + 16, '\0');
     int written = 0;
     int final = 0;
     auto* output = reinterpret_cast<unsigned char*>(out.data());
     if (!context ||
-        EVP_CipherInit_ex(context.get(), EVP_aes_128_cfb128(), nullptr,
-                          reinterpret_cast<const unsigned char*>(key.data()),
-                          reinterpret_cast<const unsigned char*>(iv.data()),
-                          encrypt ? 1 : 0) != 1 ||
-        EVP_CipherUpdate(context.get(), output, &written,
-                         reinterpret_cast<const unsigned char*>(data.data()),
-                         static_cast<int>(data.size())) != 1 ||
-        EVP_CipherFinal_ex(context.get(), output + written, &final) != 1) {
+        crypto.EVP_CipherInit_ex(context.get(), crypto.EVP_aes_128_cfb128(), nullptr,
+                                 reinterpret_cast<const unsigned char*>(key.data()),
+                                 reinterpret_cast<const unsigned char*>(iv.data()),
+                                 encrypt ? 1 : 0) != 1 ||
+        crypto.EVP_CipherUpdate(context.get(), output, &written,
+                                reinterpret_cast<const unsigned char*>(data.data()),
+                                static_cast<int>(data.size())) != 1 ||
+        crypto.EVP_CipherFinal_ex(context.get(), output + written, &final) != 1) {
         throw std::runtime_error("AES-128-CFB failed");
     }
     out.resize(static_cast<size_t>(written + final));
@@ -122,7 +171,8 @@ std::string AesCfb128(bool encrypt, std::string_view key, std::string_view iv,
 
 std::string RandomBytes(size_t count) {
     std::string bytes(count, '\0');
-    if (RAND_bytes(reinterpret_cast<unsigned char*>(bytes.data()), static_cast<int>(count)) != 1) {
+    if (Crypto().RAND_bytes(reinterpret_cast<unsigned char*>(bytes.data()),
+                            static_cast<int>(count)) != 1) {
         throw std::runtime_error("no random bytes available");
     }
     return bytes;
