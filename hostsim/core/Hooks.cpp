@@ -34,6 +34,11 @@ std::vector<std::function<void(Store&)>>& BootSteps() {
     return steps;
 }
 
+std::map<std::string, ScaleKey>& ScaleKeys() {
+    static std::map<std::string, ScaleKey> keys;
+    return keys;
+}
+
 }  // namespace
 
 bool RegisterTables(TableSet tables) {
@@ -64,6 +69,17 @@ bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler) {
 bool RegisterBootStep(std::function<void(Store&)> step) {
     BootSteps().push_back(std::move(step));
     return true;
+}
+
+bool RegisterScaleKey(const std::string& key, ScaleKey handler) {
+    if (!ScaleKeys().emplace(key, std::move(handler)).second) {
+        throw std::logic_error("scale key registered twice: " + key);
+    }
+    return true;
+}
+
+const std::map<std::string, ScaleKey>& RegisteredScaleKeys() {
+    return ScaleKeys();
 }
 
 void RunBootSteps(Store& store) {

@@ -37,4 +37,14 @@ class Store;
 // back to what is configured.
 bool RegisterBootStep(std::function<void(Store&)> step);
 
+// A large host for load tests, `brixsim init --scale KEY=N,...`: each area that owns a table
+// worth growing registers a key for it. `grow` runs inside the write transaction that follows
+// the seeding of a new host and adds rows until the table holds `count` (a host never has fewer
+// than its seeded rows). `what` says what N counts, for the usage text.
+struct ScaleKey {
+    std::string what;
+    std::function<void(Store& store, int64_t count)> grow;
+};
+bool RegisterScaleKey(const std::string& key, ScaleKey handler);
+
 }  // namespace BrixSim

@@ -4,6 +4,7 @@
 #include <initializer_list>
 #include <string>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 
 namespace {
@@ -626,6 +627,26 @@ void Seed(BrixSim::Store& store) {
         }
     });
 }
+
+// Load-test modules: inbox drivers without requirements after the seeded ones; every other one
+// is loaded.
+void GrowModules(BrixSim::Store& store, int64_t count) {
+    auto existing = store.Prepare("SELECT COUNT(*), MAX(seq) FROM modules");
+    existing.Step();
+    int64_t seq = existing.Int(1);
+    auto module = store.Prepare(
+        "INSERT INTO modules (name, seq, file, license, version, build_type, file_version,"
+        " provides, provides_versions, package, acceptance, loaded, enabled)"
+        " VALUES (?, ?, ?, 'Ostrel', '1.0.0', 'release', '1.0.0-8.0.412', '', '', ?, ?, ?, 1)");
+    for (int64_t index = 0, have = existing.Int(0); have < count; ++index, ++have) {
+        const std::string name = "loadtest_" + std::to_string(index);
+        module.Bind(1, name).Bind(2, ++seq).Bind(3, "/usr/lib/brix/kmod/" + name);
+        module.Bind(4, kInbox).Bind(5, kCertified).Bind(6, index % 2 == 0).Run();
+        module.Reset();
+    }
+}
+
+const bool scalable = BrixSim::RegisterScaleKey("modules", {"kernel modules", GrowModules});
 
 const bool registered = BrixSim::RegisterTables({
     "modules",

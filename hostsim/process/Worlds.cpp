@@ -173,6 +173,40 @@ void Seed(Store& store) {
     }
 }
 
+// Load-test worlds: one-world cartels of a job runner started by init, numbered on from the
+// highest world id.
+void GrowWorlds(Store& store, int64_t count) {
+    auto existing = store.Prepare(
+        "SELECT COUNT(*), MAX(id), (SELECT cartel_id FROM process_worlds ORDER BY id LIMIT 1),"
+        " (SELECT session_id FROM process_worlds ORDER BY id LIMIT 1) FROM process_worlds");
+    existing.Step();
+    const int64_t initCartel = existing.Int(2);
+    const int64_t initSession = existing.Int(3);
+    int64_t nextId = existing.Int(1) + 1;
+    auto insert =
+        store.Prepare("INSERT INTO process_worlds VALUES (?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
+    for (int64_t slot = existing.Int(0); slot < count; ++slot) {
+        const int64_t cartelId = nextId;
+        const int64_t worldId = nextId + 1;
+        const std::string number = std::to_string(slot);
+        insert.Bind(1, worldId)
+            .Bind(2, "jobrunner-" + number)
+            .Bind(3, "/usr/lib/brix/bin/jobrunner --slot " + number)
+            .Bind(4, cartelId)
+            .Bind(5, initCartel)
+            .Bind(6, worldId)
+            .Bind(7, cartelId)
+            .Bind(8, initSession)
+            .Bind(9, kFlagUser | kFlagLeader)
+            .Bind(10, slot % 7 == 0 ? kRunning : kWaiting)
+            .Bind(11, kUser)
+            .Bind(12, kShellTools)
+            .Run();
+        insert.Reset();
+        nextId += 2;
+    }
+}
+
 std::vector<std::string> ListWorlds(const std::vector<std::string>& instancePath) {
     std::vector<std::string> names;
     if (!instancePath.empty()) return names;
@@ -221,6 +255,7 @@ const bool registered = [] {
              throw HostCtl::Lib::HostCtlException("Sysinfo node system.worlds has no record");
          },
          ListWorlds});
+    BrixSim::RegisterScaleKey("worlds", {"user-level worlds", GrowWorlds});
     BrixSim::RegisterSysinfoNode(
         KSI_NODE_system_worlds_info,
         {GetWorld, [](const std::vector<std::string>&) { return std::vector<std::string>(); }});

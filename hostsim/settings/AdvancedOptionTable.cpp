@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "core/Hooks.h"
 #include "core/Store.h"
 
 namespace {
@@ -409,6 +410,44 @@ void Seed(BrixSim::Store& store) {
         store.SetInt("coredump.autoCreateDumpFile", 1);
     });
 }
+
+// Load-test options: integer options under /LoadTest, a thousand to a branch, after the seeded
+// ones in the kernel's order.
+void GrowOptions(BrixSim::Store& store, int64_t count) {
+    constexpr int64_t kPerBranch = 1000;
+    auto existing = store.Prepare(
+        "SELECT (SELECT COUNT(*) FROM adv_options), (SELECT MAX(seq) FROM adv_options),"
+        " (SELECT MAX(seq) FROM adv_branches)");
+    existing.Step();
+    int64_t optionSeq = existing.Int(1);
+    int64_t branchSeq = existing.Int(2);
+    auto branch =
+        store.Prepare("INSERT INTO adv_branches (path, parent, name, seq) VALUES (?, ?, ?, ?)");
+    auto option = store.Prepare(
+        "INSERT INTO adv_options (path, branch, seq, kind, type, description, int_value,"
+        " int_default, int_min, int_max, str_value, str_default, valid_chars, user_set)"
+        " VALUES (?, ?, ?, 'int', 0, ?, ?, 0, 0, 1000000, '', '', '', 0)");
+    auto addBranch = [&](const std::string& parent, const std::string& name) {
+        branch.Bind(1, parent + "/" + name).Bind(2, parent).Bind(3, name).Bind(4, ++branchSeq);
+        branch.Run();
+        branch.Reset();
+    };
+    for (int64_t index = 0, have = existing.Int(0); have < count; ++index, ++have) {
+        if (index == 0) addBranch("", "LoadTest");
+        const std::string group = "Group" + std::to_string(index / kPerBranch);
+        if (index % kPerBranch == 0) addBranch("/LoadTest", group);
+        const std::string name = "Option" + std::to_string(index);
+        option.Bind(1, "/LoadTest/" + group + "/" + name)
+            .Bind(2, "/LoadTest/" + group)
+            .Bind(3, ++optionSeq)
+            .Bind(4, "Load test option " + std::to_string(index))
+            .Bind(5, index % 1000)
+            .Run();
+        option.Reset();
+    }
+}
+
+const bool scalable = BrixSim::RegisterScaleKey("options", {"advanced options", GrowOptions});
 
 const bool registered = BrixSim::RegisterTables({
     "advanced",

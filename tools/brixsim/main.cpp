@@ -3,10 +3,12 @@
 #include <stdlib.h>
 
 #include <algorithm>
+#include <charconv>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
 #include <iterator>
+#include <map>
 #include <nlohmann/json.hpp>
 #include <optional>
 #include <sstream>
@@ -30,7 +32,8 @@ constexpr const char* kUsage =
     "${XDG_STATE_HOME:-$HOME/.local/state}/brixsim/default.\n"
     "\n"
     "Commands:\n"
-    "  init [--force]                      create and seed the host (--force: start afresh)\n"
+    "  init [--force] [--scale KEY=N,...]  create and seed the host (--force: start afresh;\n"
+    "                                      --scale: grow tables to N rows for load tests)\n"
     "  fault set OPERATION MESSAGE [--detail TEXT] [--times N]\n"
     "                                      make OPERATION fail with MESSAGE (N times, or until\n"
     "                                      cleared)\n"
@@ -42,6 +45,17 @@ constexpr const char* kUsage =
     "  import FILE                         replace the tables FILE holds (- for standard input)\n"
     "  feature set ENTRY on|off            switch a feature entry (0-255)\n"
     "  feature get ENTRY                   print on or off\n";
+
+// The usage with the keys of init --scale, as the areas registered them.
+std::string Usage() {
+    std::string usage = kUsage;
+    usage += "\nKeys of init --scale:\n";
+    for (const auto& [key, scale] : BrixSim::RegisteredScaleKeys()) {
+        usage += "  " + key + std::string(key.size() < 36 ? 36 - key.size() : 1, ' ') + scale.what +
+                 "\n";
+    }
+    return usage;
+}
 
 // A wrong invocation: the message and the usage go to standard error, exit status 2.
 struct UsageError : std::runtime_error {
@@ -68,11 +82,51 @@ int FeatureEntry(const std::string& text) {
 
 // ---------------------------------------------------------------------------------------------
 
+// Largest N of init --scale: a host of this size still fits in a few hundred megabytes.
+constexpr int64_t kMaxScale = 10'000'000;
+
+// "worlds=100000,options=10000" -> {{"worlds", 100000}, {"options", 10000}}, checked against
+// the registered keys before anything is created.
+std::map<std::string, int64_t> ParseScale(const std::string& spec) {
+    std::map<std::string, int64_t> counts;
+    std::stringstream items(spec);
+    std::string item;
+    while (std::getline(items, item, ',')) {
+        const auto equals = item.find('=');
+        if (equals == std::string::npos) {
+            throw UsageError("init --scale: expected KEY=N, got \"" + item + "\"");
+        }
+        const std::string key = item.substr(0, equals);
+        const std::string number = item.substr(equals + 1);
+        if (BrixSim::RegisteredScaleKeys().count(key) == 0) {
+            throw UsageError("init --scale: unknown key \"" + key + "\"");
+        }
+        int64_t count = 0;
+        const auto parsed = std::from_chars(number.data(), number.data() + number.size(), count);
+        if (parsed.ec != std::errc() || parsed.ptr != number.data() + number.size() || count < 1 ||
+            count > kMaxScale) {
+            throw UsageError("init --scale: " + key + " must be a whole number from 1 to " +
+                             std::to_string(kMaxScale) + ", got \"" + number + "\"");
+        }
+        if (!counts.emplace(key, count).second) {
+            throw UsageError("init --scale: " + key + " given twice");
+        }
+    }
+    if (counts.empty() || spec.back() == ',') {
+        throw UsageError("init --scale: expected KEY=N,..., got \"" + spec + "\"");
+    }
+    return counts;
+}
+
 int Init(const Args& args) {
     bool force = false;
+    std::map<std::string, int64_t> scale;
     for (size_t i = 0; i < args.size(); ++i) {
         if (args[i] == "--force") {
             force = true;
+        } else if (args[i] == "--scale") {
+            if (i + 1 >= args.size()) throw UsageError("init: --scale needs KEY=N,...");
+            scale = ParseScale(args[++i]);
         } else if (args[i] == "--root" && i + 1 < args.size()) {
             setenv("BRIX_HOST_ROOT", args[++i].c_str(), 1);
         } else {
@@ -89,7 +143,14 @@ int Init(const Args& args) {
         }
         for (const auto& entry : fs::directory_iterator(root)) fs::remove_all(entry.path());
     }
-    BrixSim::Store::Get();
+    BrixSim::Store& store = BrixSim::Store::Get();
+    if (!scale.empty()) {
+        store.Write([&] {
+            for (const auto& [key, count] : scale) {
+                BrixSim::RegisteredScaleKeys().at(key).grow(store, count);
+            }
+        });
+    }
     std::cout << "Seeded host at " << BrixSim::Store::Get().Root().string() << "\n";
     return 0;
 }
@@ -263,7 +324,7 @@ int Main(Args args) {
     const std::string command = args[0];
     const Args rest(args.begin() + 1, args.end());
     if (command == "help" || command == "--help" || command == "-h") {
-        std::cout << kUsage;
+        std::cout << Usage();
         return 0;
     }
     if (command == "init") return Init(rest);
@@ -281,7 +342,7 @@ int main(int argc, char** argv) {
     try {
         return Main(Args(argv + 1, argv + argc));
     } catch (const UsageError& e) {
-        std::cerr << "brixsim: " << e.what() << "\n\n" << kUsage;
+        std::cerr << "brixsim: " << e.what() << "\n\n" << Usage();
         return 2;
     } catch (const std::exception& e) {
         std::cerr << "brixsim: " << e.what() << "\n";
