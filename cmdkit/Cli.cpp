@@ -6,6 +6,8 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
+#include <atomic>
 #include <cstdlib>
 #include <iostream>
 
@@ -14,6 +16,16 @@
 namespace CmdKit::AutoCli {
 
 namespace {
+
+void ExecuteDirectly(const std::function<void()>& execute) {
+    execute();
+}
+
+std::atomic<ExecutionScope> executionScope{&ExecuteDirectly};
+
+ExecutionScope CurrentExecutionScope() {
+    return executionScope.load();
+}
 
 constexpr const char* kFormatters = "simple, table, json, xml, csv, keyvalue";
 
@@ -225,7 +237,7 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
     }
     auto output = CallSpec::Output::New();
     try {
-        command.GetDispatcher()->Execute(input, output);
+        CurrentExecutionScope()([&] { command.GetDispatcher()->Execute(input, output); });
     } catch (const std::exception& error) {
         for (const auto& message : output->GetErrorMessages()) err << message << '\n';
         err << "Error: " << error.what() << '\n';
@@ -267,6 +279,10 @@ int Guarded(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::s
 }
 
 }  // namespace
+
+void SetExecutionScope(ExecutionScope scope) {
+    executionScope.store(scope ? scope : &ExecuteDirectly);
+}
 
 int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
            std::ostream& out, std::ostream& err) {

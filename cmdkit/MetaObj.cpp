@@ -1,14 +1,19 @@
 // Result objects: structures, lists and scalars.
 #include "cmdkit/MetaObj.h"
 
+#include <algorithm>
+#include <memory>
+
 #include "cmdkit/CmdKitException.h"
 
 namespace CmdKit::MetaObj {
 
 const std::string MetaStruct::_docEmpty;
 
+// Scalars are made with their reference count in one allocation: a listing makes one for every
+// field of every row.
 std::shared_ptr<MetaString> MetaString::New() {
-    return std::shared_ptr<MetaString>(new MetaString);
+    return std::make_shared<MetaString>();
 }
 
 std::shared_ptr<MetaString> MetaString::New(const std::string& text) {
@@ -18,7 +23,7 @@ std::shared_ptr<MetaString> MetaString::New(const std::string& text) {
 }
 
 std::shared_ptr<MetaInt> MetaInt::New() {
-    return std::shared_ptr<MetaInt>(new MetaInt);
+    return std::make_shared<MetaInt>();
 }
 
 std::shared_ptr<MetaInt> MetaInt::New(long value) {
@@ -28,7 +33,7 @@ std::shared_ptr<MetaInt> MetaInt::New(long value) {
 }
 
 std::shared_ptr<MetaBool> MetaBool::New() {
-    return std::shared_ptr<MetaBool>(new MetaBool);
+    return std::make_shared<MetaBool>();
 }
 
 std::shared_ptr<MetaBool> MetaBool::New(bool value) {
@@ -49,6 +54,10 @@ void MetaStruct::Put(const std::string& name, std::shared_ptr<MetaObject> value,
             field.description = doc;
             return;
         }
+    }
+    // Rows usually have several fields: start with eight, then grow by half.
+    if (fields_.size() == fields_.capacity()) {
+        fields_.reserve(std::max<size_t>(8, fields_.size() + fields_.size() / 2));
     }
     fields_.push_back(Field{name, std::move(value), doc});
 }

@@ -122,8 +122,26 @@ int RunHostCommand(const std::vector<std::string>& argv, const std::string& user
     return status;
 }
 
+// A command reads the host in one read transaction: one consistent view, and the database's
+// locks taken once instead of once a statement. Writes, and so the programs it runs (each
+// journalled), end it and start a new one.
+void InOneReadTransaction(const std::function<void()>& execute) {
+    BrixSim::Store* store = nullptr;
+    try {
+        store = &BrixSim::Store::Get();
+    } catch (const std::exception&) {
+        // The command's own calls report the store that cannot be opened.
+    }
+    if (store) {
+        store->Read(execute);
+    } else {
+        execute();
+    }
+}
+
 const bool installed = [] {
     CmdKit::AutoCli::SetHostCommandRunner(&RunHostCommand);
+    CmdKit::AutoCli::SetExecutionScope(&InOneReadTransaction);
     return true;
 }();
 

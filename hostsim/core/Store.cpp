@@ -14,6 +14,7 @@
 #include <stdexcept>
 #include <system_error>
 #include <thread>
+#include <utility>
 
 #include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
@@ -137,11 +138,18 @@ Stmt::Stmt(sqlite3* db, std::string_view sql) : db_(db) {
 }
 
 Stmt::~Stmt() {
-    sqlite3_finalize(stmt_);
+    if (inUse_) {
+        sqlite3_reset(stmt_);
+        sqlite3_clear_bindings(stmt_);
+        *inUse_ = false;
+    } else {
+        sqlite3_finalize(stmt_);
+    }
 }
 
-Stmt::Stmt(Stmt&& other) noexcept : db_(other.db_), stmt_(other.stmt_) {
+Stmt::Stmt(Stmt&& other) noexcept : db_(other.db_), stmt_(other.stmt_), inUse_(other.inUse_) {
     other.stmt_ = nullptr;
+    other.inUse_ = nullptr;
 }
 
 Stmt& Stmt::Bind(int index, std::string_view text) {
@@ -244,7 +252,59 @@ fs::path Store::DefaultRoot() {
 Store::Store(fs::path root) : root_(std::move(root)) {}
 
 Store::~Store() {
+    for (auto& [sql, cached] : statements_) sqlite3_finalize(cached.stmt);
     if (db_) sqlite3_close_v2(db_);
+}
+
+Stmt Store::Prepare(std::string_view sql) {
+    // Enough for every fixed statement of the simulator; statements built from data beyond it
+    // are not kept.
+    constexpr size_t kMaxCached = 512;
+    if (!db_) throw std::runtime_error("host store: not open");
+    auto found = statements_.find(std::string(sql));
+    if (found == statements_.end()) {
+        if (statements_.size() >= kMaxCached) return Stmt(db_, sql);
+        sqlite3_stmt* stmt = nullptr;
+        if (sqlite3_prepare_v3(db_, sql.data(), static_cast<int>(sql.size()),
+                               SQLITE_PREPARE_PERSISTENT, &stmt, nullptr) != SQLITE_OK) {
+            throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)) + " in \"" +
+                                     std::string(sql) + "\"");
+        }
+        if (!stmt) throw std::runtime_error("host store: empty statement");
+        found = statements_.emplace(std::string(sql), CachedStmt{stmt, false}).first;
+    }
+    if (found->second.inUse) return Stmt(db_, sql);
+    found->second.inUse = true;
+    return Stmt(db_, found->second.stmt, &found->second.inUse);
+}
+
+namespace {
+// Every read transaction of the process gets its own number, whichever store it is on.
+uint64_t NextReadSnapshot() {
+    static uint64_t last = 0;
+    return ++last;
+}
+}  // namespace
+
+void Store::Read(const std::function<void()>& work) {
+    if (writeDepth_ > 0 || readDepth_ > 0) {
+        work();
+        return;
+    }
+    Exec("BEGIN");
+    readDepth_ = 1;
+    readSnapshot_ = NextReadSnapshot();
+    try {
+        work();
+    } catch (...) {
+        readDepth_ = 0;
+        readSnapshot_ = 0;
+        sqlite3_exec(db_, "COMMIT", nullptr, nullptr, nullptr);
+        throw;
+    }
+    readDepth_ = 0;
+    readSnapshot_ = 0;
+    Exec("COMMIT");
 }
 
 void Store::Open() {
@@ -366,6 +426,17 @@ std::optional<fs::path> Store::Resolve(std::string_view hostPath) const {
 
 void Store::Check(std::string_view operation) {
     TraceOperation(operation);
+    // Inside a read transaction the armed faults cannot change (a fault that fires writes, and
+    // that ends the transaction): read them once, not once a call.
+    if (const uint64_t snapshot = ReadSnapshot(); snapshot != 0) {
+        if (faultsSnapshot_ != snapshot) {
+            faultsSnapshot_ = snapshot;
+            armedFaults_.clear();
+            auto armed = Prepare("SELECT op FROM faults");
+            while (armed.Step()) armedFaults_.insert(armed.Text(0));
+        }
+        if (armedFaults_.find(std::string(operation)) == armedFaults_.end()) return;
+    }
     {
         auto fault = Prepare("SELECT message, detail, remaining FROM faults WHERE op = ?");
         fault.Bind(1, operation);
@@ -398,6 +469,24 @@ void Store::Check(std::string_view operation) {
 
 void Store::Write(const std::function<void()>& work) {
     auto& pending = PendingHits();
+    if (writeDepth_ == 0 && readDepth_ > 0) {
+        // A read transaction cannot become a write one once another process has written; end
+        // it, write, and read on in a new one.
+        Exec("COMMIT");
+        readSnapshot_ = 0;
+        const int depth = std::exchange(readDepth_, 0);
+        struct Resume {
+            Store& store;
+            int depth;
+            ~Resume() {
+                sqlite3_exec(store.db_, "BEGIN", nullptr, nullptr, nullptr);
+                store.readDepth_ = depth;
+                store.readSnapshot_ = NextReadSnapshot();
+            }
+        } resume{*this, depth};
+        Write(work);
+        return;
+    }
     if (writeDepth_ == 0) {
         Exec("BEGIN IMMEDIATE");
         writeDepth_ = 1;

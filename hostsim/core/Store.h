@@ -7,9 +7,11 @@
 #include <functional>
 #include <initializer_list>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <type_traits>
+#include <unordered_map>
 #include <utility>
 #include <variant>
 #include <vector>
@@ -25,7 +27,7 @@ using Fields = std::vector<std::pair<std::string, Value>>;
 
 // A prepared statement; bind with 1-based indexes, step, read columns.
 class Stmt {
-public:
+  public:
     Stmt(sqlite3* db, std::string_view sql);
     ~Stmt();
     Stmt(Stmt&& other) noexcept;
@@ -54,16 +56,21 @@ public:
     int64_t Int(int column) const;
     bool IsNull(int column) const;
 
-private:
+  private:
+    friend class Store;
+    // A statement of the store's cache: reset instead of finalised, and marked free again.
+    Stmt(sqlite3* db, sqlite3_stmt* cached, bool* inUse) : db_(db), stmt_(cached), inUse_(inUse) {}
+
     sqlite3* db_;
     sqlite3_stmt* stmt_ = nullptr;
+    bool* inUse_ = nullptr;
 };
 
 // One area's tables: created in every host, seeded in a new one. Register at static
 // initialisation with `static const bool registered = BrixSim::RegisterTables({...});`.
 struct TableSet {
-    std::string name;          // the area, e.g. "coredump"
-    std::string schema;        // CREATE TABLE IF NOT EXISTS statements
+    std::string name;                        // the area, e.g. "coredump"
+    std::string schema;                      // CREATE TABLE IF NOT EXISTS statements
     std::function<void(class Store&)> seed;  // fills a new host deterministically; may be empty
 };
 bool RegisterTables(TableSet tables);
@@ -72,7 +79,7 @@ bool RegisterTables(TableSet tables);
 bool RegisterOperations(std::initializer_list<const char*> operations);
 
 class Store {
-public:
+  public:
     // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
     // first use; a missing root is created and seeded.
     static Store& Get();
@@ -96,7 +103,17 @@ public:
     // throws. Nested calls join the outer transaction.
     void Write(const std::function<void()>& work);
 
-    Stmt Prepare(std::string_view sql) { return Stmt(db_, sql); }
+    // Runs `work` in one read transaction, so that the reads in it see one state of the host
+    // and take the database's locks once. Nested in a read or write transaction it just runs.
+    // A write inside ends the read transaction and starts a new one after it.
+    void Read(const std::function<void()>& work);
+    // Non-zero, and different for every read transaction, while Read runs outside any write:
+    // what an area may key a cache of rows on, as the rows cannot change until it changes.
+    uint64_t ReadSnapshot() const { return writeDepth_ == 0 ? readSnapshot_ : 0; }
+
+    // The statements are prepared once per store and kept (SQLite's parser costs more than
+    // most of the queries); a statement in use when asked for again is prepared afresh.
+    Stmt Prepare(std::string_view sql);
     void Exec(std::string_view sql);
 
     // The "host" key-value table, for the host's scalar settings.
@@ -113,14 +130,25 @@ public:
 
     ~Store();
 
-private:
+  private:
     explicit Store(std::filesystem::path root);
     void Open();
     void CreateSchema(bool seed);
 
+    struct CachedStmt {
+        sqlite3_stmt* stmt = nullptr;
+        bool inUse = false;
+    };
+
     std::filesystem::path root_;
     sqlite3* db_ = nullptr;
     int writeDepth_ = 0;
+    int readDepth_ = 0;
+    uint64_t readSnapshot_ = 0;
+    std::unordered_map<std::string, CachedStmt> statements_;
+    // The operations with a fault armed, as read in the read transaction `faultsSnapshot_`.
+    uint64_t faultsSnapshot_ = 0;
+    std::set<std::string> armedFaults_;
 };
 
 }  // namespace BrixSim

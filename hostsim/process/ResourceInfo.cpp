@@ -76,21 +76,26 @@ ResourceInfoImpl::ResourceInfoImpl() = default;
 ResourceInfoImpl::~ResourceInfoImpl() = default;
 
 std::vector<std::unique_ptr<HostCtl::Resource::World>> ResourceInfoImpl::GetAllWorlds() {
-    BrixSim::Store::Get().Check("KernCtl::Resource::ResourceInfoImpl::GetAllWorlds");
-    Util::Sysinfo list(KSI_NODE_system_worlds);
-    std::vector<std::string> ids;
-    list.List(ids);
-
-    Util::Sysinfo info(KSI_NODE_system_worlds_info);
+    BrixSim::Store& store = BrixSim::Store::Get();
+    store.Check("KernCtl::Resource::ResourceInfoImpl::GetAllWorlds");
+    // One read transaction for the listing and every record: one state of the host, and the
+    // records come from the listing's pass over the table.
     std::vector<std::unique_ptr<HostCtl::Resource::World>> worlds;
-    worlds.reserve(ids.size());
-    unsigned char record[R::kSize];
-    for (const auto& id : ids) {
-        info.ResetInstance();
-        info.AddInstancePath(id);
-        info.Get(record, sizeof record);
-        worlds.push_back(std::make_unique<WorldImpl>(record));
-    }
+    store.Read([&] {
+        Util::Sysinfo list(KSI_NODE_system_worlds);
+        std::vector<std::string> ids;
+        list.List(ids);
+
+        Util::Sysinfo info(KSI_NODE_system_worlds_info);
+        worlds.reserve(ids.size());
+        unsigned char record[R::kSize];
+        for (const auto& id : ids) {
+            info.ResetInstance();
+            info.AddInstancePath(id);
+            info.Get(record, sizeof record);
+            worlds.push_back(std::make_unique<WorldImpl>(record));
+        }
+    });
     return worlds;
 }
 

@@ -1,6 +1,7 @@
 // The kernel's user-level worlds: the table they live in, a realistic seeded host, and the two
 // system-information nodes through which the kernel publishes them.
 #include <charconv>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -207,11 +208,66 @@ void GrowWorlds(Store& store, int64_t count) {
     }
 }
 
+// The columns of a world's record, in the order GetWorld writes them.
+constexpr const char* kWorldColumns =
+    "id, cartel_id, parent_cartel_id, world_group_id, cartel_group_id, session_id, flags, state,"
+    " type, domain, name, command_line";
+
+struct WorldRow {
+    uint32_t id, cartel, parentCartel, worldGroup, cartelGroup, session, flags;
+    uint8_t state, type;
+    uint32_t domain;
+    std::string name, commandLine;
+};
+
+WorldRow ReadRow(const BrixSim::Stmt& row) {
+    auto u32 = [&](int column) { return static_cast<uint32_t>(row.Int(column)); };
+    return {u32(0),
+            u32(1),
+            u32(2),
+            u32(3),
+            u32(4),
+            u32(5),
+            u32(6),
+            static_cast<uint8_t>(row.Int(7)),
+            static_cast<uint8_t>(row.Int(8)),
+            u32(9),
+            row.Text(10),
+            row.Text(11)};
+}
+
+// Inside one read transaction the listing reads every record in the same pass, and the records
+// asked for next, in the listing's order, come from it: a listing of many worlds then costs one
+// query, not one a world. Each record is handed out once and its memory freed.
+struct ListedWorlds {
+    uint64_t snapshot = 0;
+    std::vector<WorldRow> rows;
+    size_t next = 0;
+};
+ListedWorlds& Listed() {
+    static ListedWorlds listed;
+    return listed;
+}
+
 std::vector<std::string> ListWorlds(const std::vector<std::string>& instancePath) {
     std::vector<std::string> names;
     if (!instancePath.empty()) return names;
-    auto rows = Store::Get().Prepare("SELECT id FROM process_worlds ORDER BY id");
-    while (rows.Step()) names.push_back(std::to_string(rows.Int(0)));
+    Store& store = Store::Get();
+    ListedWorlds& listed = Listed();
+    listed.rows.clear();
+    listed.next = 0;
+    listed.snapshot = store.ReadSnapshot();
+    if (listed.snapshot == 0) {
+        auto rows = store.Prepare("SELECT id FROM process_worlds ORDER BY id");
+        while (rows.Step()) names.push_back(std::to_string(rows.Int(0)));
+        return names;
+    }
+    auto rows =
+        store.Prepare(std::string("SELECT ") + kWorldColumns + " FROM process_worlds ORDER BY id");
+    while (rows.Step()) {
+        names.push_back(std::to_string(rows.Int(0)));
+        listed.rows.push_back(ReadRow(rows));
+    }
     return names;
 }
 
@@ -222,30 +278,36 @@ void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t
         throw HostCtl::Lib::HostCtlException("Sysinfo node system.worlds.info: no world selected");
     }
     const std::string& name = instancePath[0];
-    int64_t id = 0;
-    const auto parsed = std::from_chars(name.data(), name.data() + name.size(), id);
-    const bool wellFormed = parsed.ec == std::errc() && parsed.ptr == name.data() + name.size();
-    auto row = Store::Get().Prepare(
-        "SELECT id, cartel_id, parent_cartel_id, world_group_id, cartel_group_id, session_id,"
-        " flags, state, type, domain, name, command_line FROM process_worlds WHERE id = ?");
-    row.Bind(1, id);
-    if (!wellFormed || !row.Step()) {
-        throw HostCtl::Lib::HostCtlException("World " + instancePath[0] + " not found");
+    ListedWorlds& listed = Listed();
+    std::optional<WorldRow> world;
+    if (listed.snapshot != 0 && listed.snapshot == Store::Get().ReadSnapshot() &&
+        listed.next < listed.rows.size() && std::to_string(listed.rows[listed.next].id) == name) {
+        world = std::move(listed.rows[listed.next++]);
+        if (listed.next == listed.rows.size()) listed.rows = {};
     }
+    if (!world) {
+        int64_t id = 0;
+        const auto parsed = std::from_chars(name.data(), name.data() + name.size(), id);
+        const bool wellFormed = parsed.ec == std::errc() && parsed.ptr == name.data() + name.size();
+        auto row = Store::Get().Prepare(std::string("SELECT ") + kWorldColumns +
+                                        " FROM process_worlds WHERE id = ?");
+        row.Bind(1, id);
+        if (wellFormed && row.Step()) world = ReadRow(row);
+    }
+    if (!world) throw HostCtl::Lib::HostCtlException("World " + instancePath[0] + " not found");
     BrixSim::Ksi::RecordWriter record(buffer, size);
-    auto u32 = [&](int column) { return static_cast<uint32_t>(row.Int(column)); };
-    record.U32(R::kId, u32(0));
-    record.U32(R::kCartelId, u32(1));
-    record.U32(R::kParentCartelId, u32(2));
-    record.U32(R::kWorldGroupId, u32(3));
-    record.U32(R::kCartelGroupId, u32(4));
-    record.U32(R::kSessionId, u32(5));
-    record.U32(R::kFlags, u32(6));
-    record.U8(R::kState, static_cast<uint8_t>(row.Int(7)));
-    record.U8(R::kType, static_cast<uint8_t>(row.Int(8)));
-    record.U32(R::kDomain, u32(9));
-    record.Text(R::kName, R::kNameWidth, row.Text(10));
-    record.Text(R::kCommandLine, R::kCommandLineWidth, row.Text(11));
+    record.U32(R::kId, world->id);
+    record.U32(R::kCartelId, world->cartel);
+    record.U32(R::kParentCartelId, world->parentCartel);
+    record.U32(R::kWorldGroupId, world->worldGroup);
+    record.U32(R::kCartelGroupId, world->cartelGroup);
+    record.U32(R::kSessionId, world->session);
+    record.U32(R::kFlags, world->flags);
+    record.U8(R::kState, world->state);
+    record.U8(R::kType, world->type);
+    record.U32(R::kDomain, world->domain);
+    record.Text(R::kName, R::kNameWidth, world->name);
+    record.Text(R::kCommandLine, R::kCommandLineWidth, world->commandLine);
 }
 
 const bool registered = [] {

@@ -1,6 +1,7 @@
 // The command tree: namespace nodes, command descriptions and commands.
 #pragma once
 
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -16,7 +17,7 @@ namespace CmdKit::AutoCli {
 enum class NodeType { Namespace, Command };
 
 class NamespaceNode {
-public:
+  public:
     virtual ~NamespaceNode();
 
     void SetDescription(const std::string& description) { description_ = description; }
@@ -27,7 +28,8 @@ public:
     virtual bool HasNamespaceNode(const std::string& name) const;
     virtual std::shared_ptr<NamespaceNode> GetNamespaceNode(const std::string& name) const;
     // Attaches a child under `name`; a word registered again replaces the earlier child.
-    virtual void RegisterNamespaceNode(std::shared_ptr<NamespaceNode> node, const std::string& name);
+    virtual void RegisterNamespaceNode(std::shared_ptr<NamespaceNode> node,
+                                       const std::string& name);
     // Follows `words` from this node as far as they name children; `consumed` receives how many.
     virtual std::shared_ptr<NamespaceNode> ResolveNode(const std::vector<std::string>& words,
                                                        size_t& consumed);
@@ -43,7 +45,7 @@ public:
 
     const std::string& GetName() const { return name_; }
 
-protected:
+  protected:
     NamespaceNode() = default;
 
     // Stores the weak self-reference that GetThis() hands out; every New() goes through this.
@@ -53,7 +55,7 @@ protected:
         return node;
     }
 
-private:
+  private:
     std::weak_ptr<NamespaceNode> self_;
     std::string description_;
     std::string name_;
@@ -62,15 +64,15 @@ private:
 };
 
 class Namespace : public NamespaceNode {
-public:
+  public:
     static std::shared_ptr<Namespace> New();
 
-protected:
+  protected:
     Namespace() = default;
 };
 
 class CommandSpec : public NamespaceNode {
-public:
+  public:
     NodeType GetType() const override { return NodeType::Command; }
 
     void SetDefaultOutputFormatter(const std::string& name) { formatter_ = name; }
@@ -86,12 +88,12 @@ public:
     virtual std::shared_ptr<CallSpec::InputSpec> GetInputSpec();
     virtual std::shared_ptr<CallSpec::OutputSpec> GetOutputSpec();
 
-protected:
+  protected:
     CommandSpec() = default;
     virtual std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() = 0;
     virtual std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() = 0;
 
-private:
+  private:
     std::string formatter_ = "simple";
     std::map<std::string, std::string> hints_;
     std::map<std::string, std::string> metadata_;
@@ -100,13 +102,13 @@ private:
 };
 
 class Command : public CommandSpec {
-public:
+  public:
     virtual void Execute(std::shared_ptr<CallSpec::Input> input,
                          std::shared_ptr<CallSpec::Output> output);
     // The object that runs this command; a command dispatches itself.
     virtual Command* GetDispatcher() { return this; }
 
-protected:
+  protected:
     Command() = default;
     virtual void ExecuteInternal(std::shared_ptr<CallSpec::Input> input,
                                  std::shared_ptr<CallSpec::Output> output) = 0;
@@ -124,5 +126,11 @@ int AutoCli_ShellCmdWithKvUsername(const std::string& commandLine, const std::st
 using HostCommandRunner = int (*)(const std::vector<std::string>& argv, const std::string& user,
                                   std::string& output);
 void SetHostCommandRunner(HostCommandRunner runner);
+
+// What every command's execution runs inside: the scope calls `execute` once. The host library
+// installs one to give a command one consistent view of the host (and to read it without
+// locking it once per call); the default just executes.
+using ExecutionScope = void (*)(const std::function<void()>& execute);
+void SetExecutionScope(ExecutionScope scope);
 
 }  // namespace CmdKit::AutoCli

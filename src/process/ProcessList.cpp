@@ -1,5 +1,8 @@
 #include "process/ProcessList.h"
 
+#include <string>
+#include <unordered_map>
+
 #include "kernctl/KernAccess.h"
 #include "kernctl/Resource.h"
 
@@ -50,10 +53,20 @@ void ProcessList::ExecuteInternal(InputPtr, OutputPtr output) {
     Guard(*output, [&] {
         KernCtl::Resource::ResourceInfoImpl resources;
         auto list = StructList(GetOutputStructure());
-        const auto worlds = resources.GetAllWorlds();
+        auto worlds = resources.GetAllWorlds();
         KernCtl::Security::KernAccessInterfaceImpl access;
+        // A host has a handful of security domains and may have many thousands of worlds: each
+        // domain's label is asked for once.
+        std::unordered_map<uint32_t, std::string> labels;
+        auto label = [&](uint32_t domain) -> const std::string& {
+            auto found = labels.find(domain);
+            if (found == labels.end()) {
+                found = labels.emplace(domain, access.GetLabel(domain, 0)).first;
+            }
+            return found->second;
+        };
         list->Reserve(worlds.size());
-        for (const auto& world : worlds) {
+        for (auto& world : worlds) {
             auto row = MetaObj::MetaStruct::New("UserWorld");
             row->SetField("Id", static_cast<long>(world->GetId()), kDoc);
             row->SetField("Name", world->GetName(), kDoc);
@@ -66,8 +79,9 @@ void ProcessList::ExecuteInternal(InputPtr, OutputPtr output) {
             row->SetField("World Flags", static_cast<long>(world->GetFlags()), kDoc);
             row->SetField("World State", world->GetStateName(), kDoc);
             row->SetField("World Type", world->GetTypeName(), kDoc);
-            row->SetField("Security Domain", access.GetLabel(world->GetSecurityDomain(), 0), kDoc);
+            row->SetField("Security Domain", label(world->GetSecurityDomain()), kDoc);
             list->Add(row);
+            world.reset();  // its memory serves the next rows
         }
         Answer(*output, list);
     });
