@@ -1,27 +1,55 @@
 // In-process costs of one invocation: building the tree, resolving a path, parsing arguments,
 // executing against the store, and formatting results of growing size.
 #include <benchmark/benchmark.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
+#include <map>
 #include <sstream>
 
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/Cli.h"
+#include "core/Registry.h"
+#include "core/Store.h"
 
 namespace {
 
 using namespace CmdKit;
 
-// Benchmarks run against a private host root so they never touch the user's default host.
-struct BenchHost {
-    BenchHost() {
-        root = std::filesystem::temp_directory_path() / "brix-bench-host";
-        setenv("BRIX_HOST_ROOT", root.c_str(), 1);
+// Benchmarks run against private host roots so they never touch the user's default host: a
+// seeded one, and ones grown with the keys of `brixsim init --scale`.
+struct BenchHosts {
+    BenchHosts() {
+        top = std::filesystem::temp_directory_path() /
+              ("brix-bench-" + std::to_string(static_cast<long>(getpid())));
+        Use("default", {});
     }
-    std::filesystem::path root;
+    ~BenchHosts() {
+        BrixSim::Store::Close();
+        std::error_code ignored;
+        std::filesystem::remove_all(top, ignored);
+    }
+    // Makes the process's store the host `name`, created with these table sizes on first use.
+    void Use(const std::string& name, const std::map<std::string, int64_t>& scale) {
+        const auto root = top / name;
+        const bool fresh = !std::filesystem::exists(root);
+        BrixSim::Store::Close();
+        setenv("BRIX_HOST_ROOT", root.c_str(), 1);
+        auto& store = BrixSim::Store::Get();
+        if (!fresh || scale.empty()) return;
+        store.Write([&] {
+            for (const auto& [key, count] : scale) {
+                BrixSim::RegisteredScaleKeys().at(key).grow(store, count);
+            }
+        });
+    }
+    std::filesystem::path top;
 };
-const BenchHost benchHost;
+BenchHosts& Hosts() {
+    static BenchHosts hosts;
+    return hosts;
+}
 
 std::shared_ptr<AutoCli::NamespaceNode> Tree() {
     std::shared_ptr<AutoCli::NamespaceNode> root = AutoCli::Namespace::New();
@@ -60,6 +88,7 @@ void ParseArguments(benchmark::State& state) {
 BENCHMARK(ParseArguments);
 
 void ExecuteGetter(benchmark::State& state) {
+    Hosts().Use("default", {});
     auto root = Tree();
     std::ostringstream out, err;
     for (auto _ : state) {
@@ -68,6 +97,43 @@ void ExecuteGetter(benchmark::State& state) {
     }
 }
 BENCHMARK(ExecuteGetter);
+
+// A getter on a host with 100,000 worlds: its cost should not depend on the host's size.
+void ExecuteGetterLargeHost(benchmark::State& state) {
+    Hosts().Use("worlds-100000", {{"worlds", 100000}});
+    auto root = Tree();
+    std::ostringstream out, err;
+    for (auto _ : state) {
+        out.str("");
+        AutoCli::RunCli(root, {"system", "uuid", "get"}, out, err);
+    }
+}
+BENCHMARK(ExecuteGetterLargeHost);
+
+// Whole listings against the store: reading, building the rows and formatting them as a table.
+void ExecuteListing(benchmark::State& state, const char* key, const char* command) {
+    std::vector<std::string> words;
+    std::istringstream split(command);
+    for (std::string word; split >> word;) words.push_back(word);
+    const int64_t count = state.range(0);
+    Hosts().Use(std::string(key) + "-" + std::to_string(count), {{key, count}});
+    auto root = Tree();
+    std::ostringstream out, err;
+    for (auto _ : state) {
+        out.str("");
+        AutoCli::RunCli(root, words, out, err);
+    }
+    state.SetItemsProcessed(state.iterations() * count);
+}
+BENCHMARK_CAPTURE(ExecuteListing, process_list, "worlds", "system process list")
+    ->Arg(1000)
+    ->Arg(10000)
+    ->Arg(100000)
+    ->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(ExecuteListing, advanced_list, "options", "system settings advanced list")
+    ->Arg(1000)
+    ->Arg(10000)
+    ->Unit(benchmark::kMillisecond);
 
 std::shared_ptr<MetaObj::MetaList> Rows(int64_t count) {
     auto prototype = MetaObj::MetaStruct::New("Row");
@@ -85,7 +151,7 @@ std::shared_ptr<MetaObj::MetaList> Rows(int64_t count) {
 
 // A command that answers a prepared list, so formatting is measured on its own.
 class ListCommand : public virtual AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<ListCommand> Make(std::shared_ptr<MetaObj::MetaList> rows) {
         auto command = AdoptSelf(std::shared_ptr<ListCommand>(new ListCommand));
         command->rows_ = std::move(rows);
@@ -93,7 +159,7 @@ public:
         return command;
     }
 
-protected:
+  protected:
     std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override {
         return CallSpec::InputSpec::New();
     }
@@ -108,7 +174,7 @@ protected:
         output->SetComplete();
     }
 
-private:
+  private:
     ListCommand() = default;
     std::shared_ptr<MetaObj::MetaList> rows_;
 };

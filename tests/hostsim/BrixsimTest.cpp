@@ -189,3 +189,89 @@ TEST(Brixsim, ImportReadsStandardInput) {
 }
 
 }  // namespace
+
+// Rows a listing command prints as JSON.
+size_t Listed(const TempHost& host, const std::vector<std::string>& command) {
+    std::vector<std::string> args{"--formatter=json"};
+    args.insert(args.end(), command.begin(), command.end());
+    const auto run = host.Cli(args);
+    EXPECT_EQ(run.status, 0) << run.err;
+    return nlohmann::json::parse(run.out).size();
+}
+
+TEST(Brixsim, InitScaleGrowsEveryAreasTableToTheCountGiven) {
+    TempHost host;
+    const size_t seededWorlds = Listed(host, {"system", "process", "list"});
+    const size_t seededOptions = Listed(host, {"system", "settings", "advanced", "list"});
+    const size_t seededModules = Listed(host, {"system", "module", "list"});
+    ASSERT_GT(seededWorlds, 5u);
+    ASSERT_GT(seededOptions, 5u);
+    ASSERT_LT(seededModules, 60u);
+    // Below the seeded count a table keeps its seeded rows; the keys come in any order.
+    auto init = host.Sim({"init", "--force", "--scale",
+                          "modules=60,worlds=" + std::to_string(seededWorlds + 40) + ",options=5"});
+    ASSERT_EQ(init.status, 0) << init.err;
+    EXPECT_EQ(init.out, "Seeded host at " + host.Root().string() + "\n");
+
+    EXPECT_EQ(Listed(host, {"system", "process", "list"}), seededWorlds + 40);
+    EXPECT_EQ(Listed(host, {"system", "module", "list"}), 60u);
+    EXPECT_EQ(Listed(host, {"system", "settings", "advanced", "list"}), seededOptions);
+
+    // The added rows read back like seeded ones.
+    const auto worlds = host.Cli({"--formatter=json", "system", "process", "list"});
+    const auto last = nlohmann::json::parse(worlds.out).back();
+    EXPECT_EQ(last["Name"], "jobrunner-" + std::to_string(seededWorlds + 39));
+    EXPECT_EQ(last["Command Line"],
+              "/usr/lib/brix/bin/jobrunner --slot " + std::to_string(seededWorlds + 39));
+    EXPECT_EQ(last["Security Domain"], "shellTools");
+    EXPECT_EQ(last["Cartel Id"].get<int64_t>() + 1, last["Id"].get<int64_t>());
+
+    ASSERT_EQ(host.Sim({"init", "--force", "--scale", "options=1000"}).status, 0);
+    const auto options = host.Cli({"--formatter=json", "system", "settings", "advanced", "list",
+                                   "--tree", "LoadTest/Group0"});
+    ASSERT_EQ(options.status, 0) << options.err;
+    const auto group = nlohmann::json::parse(options.out);
+    // What the seeded options leave of the thousand, all in the first branch of a thousand.
+    ASSERT_EQ(group.size(), 1000 - seededOptions);
+    EXPECT_EQ(group[0]["Path"], "/LoadTest/Group0/Option0");
+    EXPECT_EQ(group.back()["Path"],
+              "/LoadTest/Group0/Option" + std::to_string(1000 - seededOptions - 1));
+    EXPECT_EQ(Listed(host, {"system", "settings", "advanced", "list"}), 1000u);
+    EXPECT_EQ(Listed(host, {"system", "module", "list"}), seededModules);
+}
+
+TEST(Brixsim, InitScaleRefusesBadKeysAndNumbersBeforeCreatingAnything) {
+    TempHost host;
+    const fs::path root = host.Root() / "never";
+    const std::vector<std::pair<std::vector<std::string>, std::string>> cases = {
+        {{"--scale"}, "init: --scale needs KEY=N,..."},
+        {{"--scale", "worlds"}, "init --scale: expected KEY=N, got \"worlds\""},
+        {{"--scale", "frogs=3"}, "init --scale: unknown key \"frogs\""},
+        {{"--scale", "worlds=0"},
+         "init --scale: worlds must be a whole number from 1 to 10000000, got \"0\""},
+        {{"--scale", "worlds=10000001"},
+         "init --scale: worlds must be a whole number from 1 to 10000000, got \"10000001\""},
+        {{"--scale", "options=-5"},
+         "init --scale: options must be a whole number from 1 to 10000000, got \"-5\""},
+        {{"--scale", "modules=1e3"},
+         "init --scale: modules must be a whole number from 1 to 10000000, got \"1e3\""},
+        {{"--scale", "worlds=3,worlds=4"}, "init --scale: worlds given twice"},
+        {{"--scale", "worlds=3,"}, "init --scale: expected KEY=N,..., got \"worlds=3,\""},
+        {{"--scale", ""}, "init --scale: expected KEY=N,..., got \"\""},
+        {{"--scale", "worlds=3,frogs=1", "--force"}, "init --scale: unknown key \"frogs\""},
+    };
+    for (const auto& [words, message] : cases) {
+        std::vector<std::string> args{"--root", root.string(), "init"};
+        args.insert(args.end(), words.begin(), words.end());
+        const auto result = host.Sim(args);
+        EXPECT_EQ(result.status, 2) << message;
+        EXPECT_EQ(result.err.substr(0, result.err.find('\n')), "brixsim: " + message);
+        EXPECT_NE(result.err.find("Keys of init --scale:\n  modules"), std::string::npos);
+        EXPECT_EQ(result.out, "");
+        EXPECT_FALSE(fs::exists(root)) << message;
+    }
+    // A refused --force leaves the existing host as it was.
+    ASSERT_EQ(host.Sim({"feature", "set", "9", "on"}).status, 0);
+    EXPECT_EQ(host.Sim({"init", "--force", "--scale", "worlds=x"}).status, 2);
+    EXPECT_EQ(host.Sim({"feature", "get", "9"}).out, "on\n");
+}
