@@ -48,16 +48,17 @@ if [ ! -r "$modules" ] || [ "$(wc -l <"$modules")" -eq 0 ]; then
   done >"$modules"
 fi
 
-# hyperfine GROUP NAME COMMAND [NAME COMMAND]...
+# hyperfine GROUP NAME COMMAND [NAME COMMAND]...   (RUNS/WARMUP in the environment override)
 bench() {
   local group=$1
   shift
+  local n=${RUNS:-$runs} w=${WARMUP:-$warmup}
   local args=()
   while [ $# -gt 0 ]; do
     args+=(-n "$1" "$2")
     shift 2
   done
-  hyperfine -N --style basic --warmup "$warmup" --runs "$runs" --export-json "$out/$group.json" \
+  hyperfine -N --style basic --warmup "$w" --runs "$n" --export-json "$out/$group.json" \
     "${args[@]}" >"$out/$group.log" 2>&1 || { cat "$out/$group.log" >&2; exit 1; }
 }
 
@@ -101,12 +102,12 @@ if [ "$scaled" = 1 ]; then
   for worlds in 10000 50000 100000; do
     export BRIX_HOST_ROOT=$work/worlds-$worlds
     "$bin/brixsim" init --scale "worlds=$worlds" >/dev/null
-    bench "process-list-$worlds" "process list, $worlds worlds" "$brixcli system process list"
+    RUNS=10 WARMUP=1 bench "process-list-$worlds" "process list, $worlds worlds" "$brixcli system process list"
     scale_rows+=("process-list-$worlds|$brixcli system process list")
   done
   export BRIX_HOST_ROOT=$work/options-10000
   "$bin/brixsim" init --scale options=10000 >/dev/null
-  bench advanced-list-10000 "advanced list, 10000 options" "$brixcli system settings advanced list"
+  RUNS=20 WARMUP=2 bench advanced-list-10000 "advanced list, 10000 options" "$brixcli system settings advanced list"
   scale_rows+=("advanced-list-10000|$brixcli system settings advanced list")
   export BRIX_HOST_ROOT=$work/large
   "$bin/brixsim" init --scale worlds=100000,options=10000,modules=10000 >/dev/null

@@ -14,8 +14,10 @@ std::vector<TableSet>& Tables() {
     return tables;
 }
 
-std::set<std::string>& Operations() {
-    static std::set<std::string> operations;
+// Kept as given (names of static storage) and sorted only when asked for: every process
+// registers them all at load, few ever list them.
+std::vector<const char*>& Operations() {
+    static std::vector<const char*> operations;
     return operations;
 }
 
@@ -52,7 +54,7 @@ bool RegisterTables(TableSet tables) {
 }
 
 bool RegisterOperations(std::initializer_list<const char*> operations) {
-    for (const char* operation : operations) Operations().insert(operation);
+    Operations().insert(Operations().end(), operations.begin(), operations.end());
     return true;
 }
 
@@ -91,7 +93,8 @@ const std::vector<TableSet>& RegisteredTables() {
 }
 
 std::vector<std::string> RegisteredOperations() {
-    return {Operations().begin(), Operations().end()};
+    std::set<std::string> sorted(Operations().begin(), Operations().end());
+    return {sorted.begin(), sorted.end()};
 }
 
 const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes() {

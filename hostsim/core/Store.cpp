@@ -338,6 +338,10 @@ void Store::Open() {
         if (attempt >= 200) throw std::runtime_error("host store: cannot switch to WAL mode");
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
     }
+    // The WAL and its index stay when the last connection closes (emptied): the next process
+    // opens them instead of creating, sizing and deleting them again.
+    int persistWal = 1;
+    sqlite3_file_control(db_, "main", SQLITE_FCNTL_PERSIST_WAL, &persistWal);
     // Every acknowledged change survives a crash or power loss.
     Exec("PRAGMA synchronous=FULL");
     Exec("PRAGMA foreign_keys=ON");

@@ -75,7 +75,8 @@ struct TableSet {
 };
 bool RegisterTables(TableSet tables);
 
-// Names of platform operations that can be made to fail, for `brixsim fault ops`.
+// Names of platform operations that can be made to fail, for `brixsim fault ops`. The names
+// must outlive the process (string literals): they are kept as given.
 bool RegisterOperations(std::initializer_list<const char*> operations);
 
 class Store {
