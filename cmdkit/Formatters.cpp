@@ -1,6 +1,7 @@
 // The output formatters: simple, table, json, xml, csv and keyvalue.
 #include <algorithm>
 #include <boost/algorithm/string/trim.hpp>
+#include <map>
 #include <nlohmann/json.hpp>
 #include <ostream>
 #include <pugixml.hpp>
@@ -47,6 +48,14 @@ std::vector<std::string> SplitNames(const std::string& text) {
     return names;
 }
 
+// SplitNames of a hint that every row of a listing asks for again: split once per text.
+const std::vector<std::string>& SplitNamesOnce(const std::string& text) {
+    thread_local std::map<std::string, std::vector<std::string>, std::less<>> split;
+    auto found = split.find(text);
+    if (found == split.end()) found = split.emplace(text, SplitNames(text)).first;
+    return found->second;
+}
+
 // The prototype of a list's elements: the list's own, else the one the declared result gives.
 const MetaStruct* ElementPrototype(const MetaList& list, const MetaObject* prototype) {
     if (list.GetPrototype()) return list.GetPrototype().get();
@@ -86,7 +95,7 @@ std::vector<std::string> ShownFields(const MetaStruct& object, const MetaStruct*
     std::vector<std::string> names;
     const std::string hint = Hint(hints, "fields:" + object.GetName());
     if (!hint.empty()) {
-        for (auto& name : SplitNames(hint)) {
+        for (const auto& name : SplitNamesOnce(hint)) {
             if (object.GetField(name) || DeclaredField(prototype, name)) names.push_back(name);
         }
         return names;
@@ -132,6 +141,9 @@ std::string InlineText(const MetaObject* object) {
 
 std::string WithUnit(const std::string& text, const Hints& hints, const std::string& structName,
                      const std::string& field) {
+    // Most results declare no units at all: then no key needs to be built for every field.
+    const auto units = hints.lower_bound("units:");
+    if (units == hints.end() || units->first.compare(0, 6, "units:") != 0) return text;
     const std::string unit = Hint(hints, "units:" + structName + "." + field);
     if (unit.empty() || text.empty()) return text;
     return text + " " + unit;

@@ -439,7 +439,7 @@ void Store::Check(std::string_view operation) {
             auto armed = Prepare("SELECT op FROM faults");
             while (armed.Step()) armedFaults_.insert(armed.Text(0));
         }
-        if (armedFaults_.find(std::string(operation)) == armedFaults_.end()) return;
+        if (armedFaults_.empty() || armedFaults_.find(operation) == armedFaults_.end()) return;
     }
     {
         auto fault = Prepare("SELECT message, detail, remaining FROM faults WHERE op = ?");

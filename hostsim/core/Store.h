@@ -149,7 +149,7 @@ class Store {
     std::unordered_map<std::string, CachedStmt> statements_;
     // The operations with a fault armed, as read in the read transaction `faultsSnapshot_`.
     uint64_t faultsSnapshot_ = 0;
-    std::set<std::string> armedFaults_;
+    std::set<std::string, std::less<>> armedFaults_;
 };
 
 }  // namespace BrixSim
