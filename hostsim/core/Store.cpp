@@ -338,10 +338,13 @@ void Store::Open() {
         if (attempt >= 200) throw std::runtime_error("host store: cannot switch to WAL mode");
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
     }
-    // The WAL and its index stay when the last connection closes (emptied): the next process
-    // opens them instead of creating, sizing and deleting them again.
+    // The WAL and its index stay when the last connection closes: the next process opens them
+    // instead of creating, sizing and deleting them again. The size limit makes that close
+    // truncate the checkpointed WAL to nothing; otherwise its old frames stay valid and every
+    // later process would read and copy all of them back again, a cost growing with the host.
     int persistWal = 1;
     sqlite3_file_control(db_, "main", SQLITE_FCNTL_PERSIST_WAL, &persistWal);
+    Exec("PRAGMA journal_size_limit=1048576");
     // Every acknowledged change survives a crash or power loss.
     Exec("PRAGMA synchronous=FULL");
     Exec("PRAGMA foreign_keys=ON");
