@@ -92,25 +92,4 @@ TEST(SlpStats, ByteCountersCarriedInFull) {
     EXPECT_NE(simple.out.find("ATRRPLY type packets sent"), std::string::npos);
 }
 
-TEST(SlpStats, FaultsBecomeMessages) {
-    for (const char* operation :
-         {"HostCtl::System::SlpAgentFactory", "HostCtl::System::SlpAgent::GetStats"}) {
-        BrixTest::TempHost host;
-        host.Fault(operation, "slpd is not running");
-        const auto run = host.Cli({"--formatter=json", "system", "slp", "stats", "get"});
-        EXPECT_EQ(run.status, 1) << operation;
-        EXPECT_EQ(run.out, "") << operation;
-        EXPECT_EQ(run.err, "slpd is not running\n") << operation;
-    }
-}
-
-TEST(SlpStats, NoParametersAndHelp) {
-    BrixTest::TempHost host;
-    const auto extra = host.Cli({"system", "slp", "stats", "get", "--node", "x"});
-    EXPECT_EQ(extra.status, 2);
-    const auto help = host.Cli({"system", "slp", "stats", "get", "--help"});
-    EXPECT_NE(help.out.find("Report operational state of Service Location Protocol Daemon"),
-              std::string::npos);
-}
-
 }  // namespace

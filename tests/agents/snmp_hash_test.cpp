@@ -5,10 +5,6 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-#include "agents/SnmpAgentGet.h"
-#include "agents/SnmpAgentHash.h"
-#include "agents/SnmpAgentSet.h"
-#include "agents/SnmpAgentTest.h"
 #include "snmp_support.h"
 
 namespace {
@@ -272,76 +268,6 @@ TEST(SnmpTestCommand, SecretsNeedAUserAndTheReportStaysShaped) {
               "File name '/nowhere.txt' could not be read, No such file or directory\n");
     EXPECT_EQ(json::parse(missing.out), json({{"comments", json::array()}}));
     EXPECT_TRUE(Calls(host, kSendWarmStart).empty());
-}
-
-struct ParamCase {
-    const char* name;
-    const char* shortName;
-    int type;
-    bool required;
-    bool secret;
-};
-
-void ExpectParams(const CmdKit::CallSpec::InputSpec& spec, const std::vector<ParamCase>& cases) {
-    const auto& params = spec.GetParameters();
-    ASSERT_EQ(params.size(), cases.size());
-    for (size_t i = 0; i < cases.size(); ++i) {
-        EXPECT_EQ(params[i]->GetName(), cases[i].name);
-        EXPECT_EQ(params[i]->GetShortName(), cases[i].shortName) << cases[i].name;
-        EXPECT_EQ(params[i]->GetType(), cases[i].type) << cases[i].name;
-        EXPECT_EQ(params[i]->IsRequired(), cases[i].required) << cases[i].name;
-        EXPECT_EQ(params[i]->IsSecret(), cases[i].secret) << cases[i].name;
-    }
-}
-
-TEST(SnmpSpecs, ParametersSecretsAndTheEngineIdPattern) {
-    using namespace OstrelCli::System;
-    ExpectParams(*SnmpAgentHash::New()->GetInputSpec(), {{"auth-hash", "A", 0, true, true},
-                                                         {"priv-hash", "X", 0, false, true},
-                                                         {"raw-secret", "r", 3, false, false}});
-    ExpectParams(*SnmpAgentTest::New()->GetInputSpec(), {{"user", "u", 0, false, false},
-                                                         {"auth-hash", "A", 0, false, false},
-                                                         {"priv-hash", "X", 0, false, false},
-                                                         {"raw-secret", "r", 3, false, false}});
-    ExpectParams(*SnmpAgentSet::New()->GetInputSpec(), {{"enable", "e", 2, false, false},
-                                                        {"port", "p", 1, false, false},
-                                                        {"communities", "c", 0, false, false},
-                                                        {"targets", "t", 0, false, false},
-                                                        {"hwsrc", "y", 0, false, false},
-                                                        {"syslocation", "L", 0, false, false},
-                                                        {"syscontact", "C", 0, false, false},
-                                                        {"loglevel", "l", 0, false, false},
-                                                        {"notraps", "n", 0, false, false},
-                                                        {"reset", "r", 3, false, false},
-                                                        {"engineid", "E", 0, false, false},
-                                                        {"authentication", "a", 0, false, false},
-                                                        {"privacy", "x", 0, false, false},
-                                                        {"users", "u", 0, false, false},
-                                                        {"remote-users", "R", 0, false, false},
-                                                        {"v3targets", "i", 0, false, false},
-                                                        {"largestorage", "s", 2, false, false}});
-    const auto set = SnmpAgentSet::New()->GetInputSpec();
-    for (const auto& param : set->GetParameters()) {
-        EXPECT_EQ(param->GetConstraint() != nullptr, param->GetName() == "engineid");
-    }
-    const auto engineId = set->FindParameter("engineid")->GetConstraint();
-    EXPECT_EQ(engineId->GetType(), 4);
-    EXPECT_EQ(engineId->GetRegex(), "(0x|0X|)[0-9a-fA-F:]+");
-    EXPECT_TRUE(SnmpAgentGet::New()->GetInputSpec()->GetParameters().empty());
-
-    struct Kind {
-        std::shared_ptr<CmdKit::AutoCli::CommandSpec> command;
-        const char* kind;
-        const char* formatter;
-    };
-    const Kind kinds[] = {{SnmpAgentGet::New(), "fetcher", "simple"},
-                          {SnmpAgentSet::New(), "operation", "simple"},
-                          {SnmpAgentHash::New(), "operation", "simple"},
-                          {SnmpAgentTest::New(), "operation", "simple"}};
-    for (const auto& k : kinds) {
-        EXPECT_EQ(k.command->GetMetaDataField("type"), k.kind);
-        EXPECT_EQ(k.command->GetDefaultOutputFormatter(), k.formatter);
-    }
 }
 
 }  // namespace
