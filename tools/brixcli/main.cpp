@@ -10,6 +10,7 @@
 #include <system_error>
 #include <vector>
 
+#include "LargePageHeap.h"
 #include "cmdkit/Cli.h"
 
 namespace {
@@ -63,6 +64,7 @@ void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    BrixCli::ReserveLargePageHeap();
     // Nothing here writes through C stdio: the streams can keep their own buffers, which
     // long listings write much faster through.
     std::ios::sync_with_stdio(false);
