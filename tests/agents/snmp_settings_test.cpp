@@ -14,6 +14,10 @@ struct Text {
     std::string value;
 };
 
+void PrintTo(const Text& text, std::ostream* out) {
+    *out << text.name;
+}
+
 class SettingsRoundTrip : public testing::TestWithParam<Text> {};
 
 // A commit rewrites the whole file from what it read, so every value a file can hold must

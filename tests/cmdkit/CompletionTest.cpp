@@ -301,6 +301,10 @@ struct GlobalCase {
     std::string err;
 };
 
+void PrintTo(const GlobalCase& row, std::ostream* out) {
+    *out << testing::PrintToString(row.args);
+}
+
 class CompletionOption : public testing::TestWithParam<GlobalCase> {};
 
 TEST_P(CompletionOption, IsAGlobalOption) {
