@@ -18,16 +18,11 @@ namespace fs = std::filesystem;
 std::shared_ptr<CallSpec::InputSpec> CreateSpec() {
     auto spec = CallSpec::InputSpec::New();
     auto size = Param("size", CallSpec::PARAM_INT, "s");
-    auto range = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
-    range->SetIntRange(1, 100);
-    size->SetConstraint(range);
+    size->SetConstraint(IntRange(1, 100));
     spec->AddParameter(size);
     auto mode = Param("mode", CallSpec::PARAM_STRING);
     mode->SetDescription("How to create it: %ENUM%. Slow is safer.");
-    auto modes = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_STRING_ENUM);
-    modes->AddStringEnum("fast", "Quick: no checks");
-    modes->AddStringEnum("slow", "");
-    mode->SetConstraint(modes);
+    mode->SetConstraint(StringEnum({{"fast", "Quick: no checks"}, {"slow", ""}}));
     spec->AddParameter(mode);
     auto secure = Param("secure", CallSpec::PARAM_BOOL, "e");
     secure->SetDescription("Encrypt the volume.");
@@ -37,11 +32,7 @@ std::shared_ptr<CallSpec::InputSpec> CreateSpec() {
     spec->AddParameter(Param("tag", CallSpec::PARAM_STRING_LIST));
     // Values a shell could mangle: a quote, an expansion, a glob.
     auto when = Param("when", CallSpec::PARAM_STRING);
-    auto times = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_STRING_ENUM);
-    times->AddStringEnum("o'clock", "");
-    times->AddStringEnum("$HOME", "");
-    times->AddStringEnum("*", "");
-    when->SetConstraint(times);
+    when->SetConstraint(StringEnum({{"o'clock", ""}, {"$HOME", ""}, {"*", ""}}));
     spec->AddParameter(when);
     return spec;
 }

@@ -6,21 +6,9 @@
 namespace CmdKitTest {
 namespace {
 
-struct DryRun {
-    int status = -1;
-    std::string out;
-    std::string err;
-};
-
-DryRun Dry(const std::shared_ptr<AutoCli::NamespaceNode>& root,
+CliRun Dry(const std::shared_ptr<AutoCli::NamespaceNode>& root,
            const std::vector<std::string>& args) {
-    std::ostringstream out;
-    std::ostringstream err;
-    DryRun run;
-    run.status = AutoCli::DryRunCli(root, args, out, err);
-    run.out = out.str();
-    run.err = err.str();
-    return run;
+    return Invoke(root, args, &AutoCli::DryRunCli);
 }
 
 // A command that must never run: it takes a required integer in 1..9 and a flag.
@@ -28,9 +16,7 @@ std::shared_ptr<FakeCommand> Guarded(bool& ran) {
     auto spec = [] {
         auto input = CallSpec::InputSpec::New();
         auto level = Param("level", CallSpec::PARAM_INT, "l", true);
-        auto range = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
-        range->SetIntRange(1, 9);
-        level->SetConstraint(range);
+        level->SetConstraint(IntRange(1, 9));
         input->AddParameter(level);
         input->AddParameter(Param("force", CallSpec::PARAM_FLAG));
         return input;

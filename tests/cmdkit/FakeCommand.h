@@ -87,18 +87,40 @@ inline std::shared_ptr<CallSpec::ParameterSpec> Param(const std::string& name, i
     return parameter;
 }
 
+inline std::shared_ptr<CallSpec::ParameterConstraint> IntRange(int64_t min, int64_t max) {
+    auto range = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
+    range->SetIntRange(min, max);
+    return range;
+}
+
+// Values with their descriptions, in order.
+inline std::shared_ptr<CallSpec::ParameterConstraint> StringEnum(
+    std::initializer_list<std::pair<std::string, std::string>> values) {
+    auto choices = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_STRING_ENUM);
+    for (const auto& [value, description] : values) choices->AddStringEnum(value, description);
+    return choices;
+}
+
+inline std::shared_ptr<CallSpec::ParameterConstraint> Regex(const std::string& pattern) {
+    auto regex = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX);
+    regex->SetStringRegex(pattern);
+    return regex;
+}
+
 struct CliRun {
     int status = -1;
     std::string out;
     std::string err;
 };
 
+// Runs `args` through `entry` (RunCli, or DryRunCli), capturing both streams.
 inline CliRun Invoke(const std::shared_ptr<AutoCli::NamespaceNode>& root,
-                     const std::vector<std::string>& args) {
+                     const std::vector<std::string>& args,
+                     decltype(&AutoCli::RunCli) entry = &AutoCli::RunCli) {
     std::ostringstream out;
     std::ostringstream err;
     CliRun run;
-    run.status = AutoCli::RunCli(root, args, out, err);
+    run.status = entry(root, args, out, err);
     run.out = out.str();
     run.err = err.str();
     return run;

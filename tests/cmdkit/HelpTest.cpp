@@ -10,9 +10,7 @@ std::shared_ptr<CallSpec::InputSpec> RichSpec() {
     auto spec = CallSpec::InputSpec::New();
     auto level = Param("level", CallSpec::PARAM_STRING, "l", true);
     level->SetDescription("The level, one of: %ENUM%.");
-    auto levels = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_STRING_ENUM);
-    levels->AddStringEnum("low", "Quiet operation");
-    levels->AddStringEnum("high", "Loud operation");
+    auto levels = StringEnum({{"low", "Quiet operation"}, {"high", "Loud operation"}});
     level->SetConstraint(levels);
     spec->AddParameter(level);
     auto mode = Param("mode", CallSpec::PARAM_STRING);
@@ -21,15 +19,11 @@ std::shared_ptr<CallSpec::InputSpec> RichSpec() {
     spec->AddParameter(mode);
     auto port = Param("port", CallSpec::PARAM_INT, "p");
     port->SetDescription("The port.");
-    auto range = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE);
-    range->SetIntRange(1, 65525);
-    port->SetConstraint(range);
+    port->SetConstraint(IntRange(1, 65525));
     spec->AddParameter(port);
     auto id = Param("id", CallSpec::PARAM_STRING);
     id->SetDescription("An identifier.");
-    auto pattern = CallSpec::ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX);
-    pattern->SetStringRegex("[a-z]+");
-    id->SetConstraint(pattern);
+    id->SetConstraint(Regex("[a-z]+"));
     spec->AddParameter(id);
     auto enabled = Param("enabled", CallSpec::PARAM_BOOL, "e");
     enabled->SetDescription("Turn on or off.");
