@@ -9,6 +9,8 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <functional>
+#include <string>
 #include <system_error>
 
 #include "coredump/DumpTargets.h"
@@ -192,9 +194,11 @@ void CheckFileName(const std::string& name) {
     }
 }
 
-// Creates a dump file and answers its host path; runs inside the caller's transaction.
+// Creates a dump file and answers its host path; runs inside the caller's transaction, and
+// names the file in `created` as soon as it exists, so that the caller can take it back when
+// the transaction does not commit.
 std::string CreateFile(Store& store, uint64_t sizeMb, const std::string& datastoreName,
-                       const std::string& fileName) {
+                       const std::string& fileName, std::string& created) {
     if (sizeMb == 0) {
         sizeMb =
             BrixSim::Coredump::DefaultDumpSizeMb(store.GetInt(BrixSim::Coredump::kMemoryKey, 0));
@@ -239,9 +243,24 @@ std::string CreateFile(Store& store, uint64_t sizeMb, const std::string& datasto
         }
     }
     WriteDumpFile(store, path, sizeMb * kMiB);
+    created = path;
     // A new file holds no dump yet: its read count is known and zero.
     store.Prepare("INSERT OR REPLACE INTO coredump_file_reads VALUES (?, 0)").Bind(1, path).Run();
     return path;
+}
+
+// Runs `work` in one write transaction; a dump file it created goes again when the transaction
+// does not commit, so that a failed call leaves the datastores as they were.
+void WriteWithFile(Store& store, const std::function<void(std::string& created)>& work) {
+    std::string created;
+    try {
+        store.Write([&] { work(created); });
+    } catch (...) {
+        if (!created.empty()) {
+            if (const auto resolved = store.Resolve(created)) ::unlink(resolved->c_str());
+        }
+        throw;
+    }
 }
 
 const bool registered = [] {
@@ -324,8 +343,8 @@ void StorageInfoImpl::CreateDiagnosticFile(uint64_t sizeMb, const std::string& d
                                            const std::string& file, bool enable) {
     auto& store = Store::Get();
     store.Check(kCreate);
-    store.Write([&] {
-        const std::string path = CreateFile(store, sizeMb, datastore, file);
+    WriteWithFile(store, [&](std::string& created) {
+        const std::string path = CreateFile(store, sizeMb, datastore, file, created);
         if (enable) {
             store.SetValue(kFileKeys.configured, path);
             store.SetValue(kFileKeys.active, path);
@@ -338,12 +357,12 @@ void StorageInfoImpl::AutoAddDiagnosticFile(uint64_t sizeMb, const std::string& 
                                             const std::string& file, bool enable) {
     auto& store = Store::Get();
     store.Check(kAutoAdd);
-    store.Write([&] {
+    WriteWithFile(store, [&](std::string& created) {
         if (store.GetInt(kAutoCreateOption, 1) == 0) return;
         for (const auto& d : Datastores(store)) {
             if (!DumpFilesIn(store, d.name).empty()) return;
         }
-        const std::string path = CreateFile(store, sizeMb, datastore, file);
+        const std::string path = CreateFile(store, sizeMb, datastore, file, created);
         if (enable) {
             store.SetValue(kFileKeys.configured, path);
             store.SetValue(kFileKeys.active, path);

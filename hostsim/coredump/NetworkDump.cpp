@@ -89,10 +89,22 @@ bool HasVnic(Store& store, const std::string& name) {
     return row.Step();
 }
 
+// The service keeps the port as a 32-bit number and the address as one of its family.
+constexpr int64_t kMaxPort = 4294967295;
+
 void SetServer(const char* operation, const std::string& interfaceName, const std::string& server,
-               uint32_t port, bool ipv6) {
+               int64_t port, bool ipv6) {
     auto& store = Store::Get();
     store.Check(operation);
+    if (ipv6 ? !HostCtl::Network::Ipv6Address::IsValidAddress(server)
+             : !HostCtl::Network::Ipv4Address::IsValidAddress(server)) {
+        throw HostCtlException(std::string("Invalid netdump server address: not an IPv") +
+                               (ipv6 ? "6" : "4") + " address.");
+    }
+    if (port < 1 || port > kMaxPort) {
+        throw HostCtlException("Invalid netdump server port " + std::to_string(port) +
+                               ": the port must be from 1 to " + std::to_string(kMaxPort) + ".");
+    }
     store.Write([&] {
         if (!HasVnic(store, interfaceName)) {
             throw HostCtlException("Interface " + interfaceName + " is not a valid vnic.");
@@ -101,7 +113,7 @@ void SetServer(const char* operation, const std::string& interfaceName, const st
         store.SetValue(kServerKey, server);
         store.SetInt(kPortKey, port);
         store.SetInt(kIpv6Key, ipv6 ? 1 : 0);
-        store.JournalCall(operation, {interfaceName, server, static_cast<int64_t>(port)});
+        store.JournalCall(operation, {interfaceName, server, port});
     });
 }
 
@@ -194,12 +206,12 @@ std::vector<std::string> NetworkInfo::GetVirtualNics() {
 }
 
 void NetworkInfo::SetNetworkDumpServerIpv4(const std::string& interfaceName,
-                                           const Ipv4Address& server, uint32_t port) {
+                                           const Ipv4Address& server, int64_t port) {
     SetServer(kSetIpv4, interfaceName, server.ToString(), port, false);
 }
 
 void NetworkInfo::SetNetworkDumpServerIpv6(const std::string& interfaceName,
-                                           const Ipv6Address& server, uint32_t port) {
+                                           const Ipv6Address& server, int64_t port) {
     SetServer(kSetIpv6, interfaceName, server.ToString(), port, true);
 }
 

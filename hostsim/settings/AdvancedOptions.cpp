@@ -1,5 +1,7 @@
 // The kernel-control adapters of the advanced-option tree.
+#include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "core/Store.h"
@@ -115,43 +117,74 @@ std::string AdvancedOptionImpl::GetDescription() {
     return data_.description;
 }
 
+// What an option object has staged since its last ApplyChange: the values to store and the
+// calls to journal, in the order they were made.
+struct StagedOptionChange {
+    std::optional<uint32_t> intValue;
+    std::optional<std::string> stringValue;
+    std::optional<bool> userSet;
+    std::vector<std::pair<std::string, std::vector<BrixSim::Value>>> calls;
+};
+
+StagedOptionChange& AdvancedOptionImpl::Staged() {
+    if (!staged_) staged_ = std::make_unique<StagedOptionChange>();
+    return *staged_;
+}
+
 void AdvancedOptionImpl::ResetToDefault() {
-    auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault");
+    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault");
     if (std::string(ClassName()) == "KernCtl::Adv::AdvancedOptionImpl") {
         throw HostCtlException("Unable to reset option " + data_.path,
                                "the option's value handler is not available");
     }
-    store.Write([&] {
-        store
-            .Prepare(
-                "UPDATE adv_options SET int_value = int_default, str_value = str_default"
-                " WHERE path = ?")
-            .Bind(1, data_.path)
-            .Run();
-        if (data_.path == kMirroredOption) store.SetInt(kMirrorKey, data_.intDefault);
-        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault", {data_.path});
-    });
+    auto& staged = Staged();
+    staged.calls.push_back({"KernCtl::Adv::AdvancedOptionImpl::ResetToDefault", {data_.path}});
+    staged.intValue = data_.intDefault;
+    staged.stringValue = data_.stringDefault;
     data_.intValue = data_.intDefault;
     data_.stringValue = data_.stringDefault;
 }
 
 void AdvancedOptionImpl::ClearOverride() {
-    auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionImpl::ClearOverride");
-    store.Write([&] {
-        store.Prepare("UPDATE adv_options SET user_set = 0 WHERE path = ?")
-            .Bind(1, data_.path)
-            .Run();
-        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ClearOverride", {data_.path});
-    });
+    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::ClearOverride");
+    auto& staged = Staged();
+    staged.calls.push_back({"KernCtl::Adv::AdvancedOptionImpl::ClearOverride", {data_.path}});
+    staged.userSet = false;
 }
 
 void AdvancedOptionImpl::ApplyChange() {
     auto& store = Store::Get();
     store.Check("KernCtl::Adv::AdvancedOptionImpl::ApplyChange");
-    store.Write(
-        [&] { store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ApplyChange", {data_.path}); });
+    store.Write([&] {
+        if (staged_) {
+            auto update = store.Prepare(
+                "UPDATE adv_options SET int_value = COALESCE(?, int_value),"
+                " str_value = COALESCE(?, str_value), user_set = COALESCE(?, user_set)"
+                " WHERE path = ?");
+            if (staged_->intValue) {
+                update.Bind(1, int64_t{*staged_->intValue});
+            } else {
+                update.BindNull(1);
+            }
+            if (staged_->stringValue) {
+                update.Bind(2, *staged_->stringValue);
+            } else {
+                update.BindNull(2);
+            }
+            if (staged_->userSet) {
+                update.Bind(3, *staged_->userSet);
+            } else {
+                update.BindNull(3);
+            }
+            update.Bind(4, data_.path).Run();
+            if (staged_->intValue && data_.path == kMirroredOption) {
+                store.SetInt(kMirrorKey, *staged_->intValue);
+            }
+            for (const auto& [operation, args] : staged_->calls) store.JournalCall(operation, args);
+        }
+        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ApplyChange", {data_.path});
+    });
+    staged_.reset();
 }
 
 void AdvancedOptionImpl::StoreInteger(uint32_t value) {
@@ -161,15 +194,10 @@ void AdvancedOptionImpl::StoreInteger(uint32_t value) {
             "the value must be between " + std::to_string(data_.intMin) + " and " +
                 std::to_string(data_.intMax));
     }
-    auto& store = Store::Get();
-    store.Write([&] {
-        store.Prepare("UPDATE adv_options SET int_value = ?, user_set = 1 WHERE path = ?")
-            .Bind(1, int64_t{value})
-            .Bind(2, data_.path)
-            .Run();
-        if (data_.path == kMirroredOption) store.SetInt(kMirrorKey, value);
-        store.JournalCall(std::string(ClassName()) + "::SetValue", {data_.path, int64_t{value}});
-    });
+    auto& staged = Staged();
+    staged.calls.push_back({std::string(ClassName()) + "::SetValue", {data_.path, int64_t{value}}});
+    staged.intValue = value;
+    staged.userSet = true;
     data_.intValue = value;
 }
 
@@ -181,14 +209,10 @@ void AdvancedOptionImpl::StoreString(const std::string& value) {
                                    "character '" + value.substr(bad, 1) + "' is not allowed");
         }
     }
-    auto& store = Store::Get();
-    store.Write([&] {
-        store.Prepare("UPDATE adv_options SET str_value = ?, user_set = 1 WHERE path = ?")
-            .Bind(1, value)
-            .Bind(2, data_.path)
-            .Run();
-        store.JournalCall(std::string(ClassName()) + "::SetValue", {data_.path, value});
-    });
+    auto& staged = Staged();
+    staged.calls.push_back({std::string(ClassName()) + "::SetValue", {data_.path, value}});
+    staged.stringValue = value;
+    staged.userSet = true;
     data_.stringValue = value;
 }
 

@@ -42,10 +42,12 @@ class NetworkInfo {
                                       uint32_t& serverPort, bool& isIpv6);
     // The names of the host's virtual network interfaces.
     virtual std::vector<std::string> GetVirtualNics();
+    // The port is passed as the caller has it; the service refuses one it cannot keep, and an
+    // address that is not of the setter's family.
     virtual void SetNetworkDumpServerIpv4(const std::string& interfaceName,
-                                          const Ipv4Address& server, uint32_t port);
+                                          const Ipv4Address& server, int64_t port);
     virtual void SetNetworkDumpServerIpv6(const std::string& interfaceName,
-                                          const Ipv6Address& server, uint32_t port);
+                                          const Ipv6Address& server, int64_t port);
     virtual void EnableNetworkDump();
     virtual void DisableNetworkDump();
     virtual bool IsNetworkDumpEnabled();

@@ -30,6 +30,9 @@ struct AdvancedOptionData {
     std::string validCharacters;
 };
 
+// Changes an option object holds until it applies them.
+struct StagedOptionChange;
+
 class AdvancedOptionImpl : public virtual HostCtl::Adv::AdvancedOption {
   public:
     explicit AdvancedOptionImpl(AdvancedOptionData data);
@@ -41,21 +44,31 @@ class AdvancedOptionImpl : public virtual HostCtl::Adv::AdvancedOption {
     std::string GetPath() override;
     int GetType() override;
     std::string GetDescription() override;
+    // Changes made through this object (a reset, a new value, a cleared override) are staged
+    // in it; ApplyChange commits them together. An object released without ApplyChange, or
+    // whose ApplyChange fails, changes nothing.
     void ResetToDefault() override;
 
     // Drops the record that the option's value was chosen by the user; called after a reset.
     void ClearOverride();
-    // Makes the last change take effect in the running kernel.
+    // Makes the changes staged since the last call take effect in the running kernel, all at
+    // once.
     void ApplyChange();
 
   protected:
     // Qualified class name, for operation names ("KernCtl::Adv::AdvancedIntegerOptionImpl").
     virtual const char* ClassName() const;
-    // Stores a new value, checked against the option's limits.
+    // Stages a new value, checked against the option's limits.
     void StoreInteger(uint32_t value);
     void StoreString(const std::string& value);
 
     AdvancedOptionData data_;
+
+  private:
+    // The changes staged since the last ApplyChange, made on first use.
+    StagedOptionChange& Staged();
+
+    std::unique_ptr<StagedOptionChange> staged_;  // null while nothing is staged
 };
 
 class AdvancedIntegerOptionImpl : public HostCtl::Adv::AdvancedIntegerOption,

@@ -7,7 +7,7 @@ namespace OstrelCli::System {
 
 namespace {
 // The port a dump server listens on unless told otherwise.
-constexpr uint32_t kDefaultServerPort = 6500;
+constexpr int64_t kDefaultServerPort = 6500;
 }  // namespace
 
 std::shared_ptr<KernelDumpNetworkSet> KernelDumpNetworkSet::New() {
@@ -54,7 +54,7 @@ void KernelDumpNetworkSet::ExecuteInternal(InputPtr input, OutputPtr output) {
     const std::string serverIpv4 = read("server-ipv4");
     const std::string serverIp = read("server-ip");
     const bool hasPort = input->HasParameter("server-port");
-    long port = 0;
+    int64_t port = 0;
     if (hasPort) {
         port = input->GetParameterInt("server-port");
         if (port <= 0) return Fail(*output, "Invalid server port number.");
@@ -80,8 +80,8 @@ void KernelDumpNetworkSet::ExecuteInternal(InputPtr input, OutputPtr output) {
             return Fail(*output, "Missing parameter: network server IP address.");
         }
         if (interfaceName.empty()) return Fail(*output, "Missing parameter: interface name.");
-        // Any positive port goes to the host as given.
-        const auto serverPort = hasPort ? static_cast<uint32_t>(port) : kDefaultServerPort;
+        // Any positive port goes to the host whole; the host refuses one it cannot keep.
+        const int64_t serverPort = hasPort ? port : kDefaultServerPort;
         if (!serverIpv4.empty() && !serverIp.empty()) {
             return Fail(*output, "Cannot set 2 server ip parameters.");
         }

@@ -46,15 +46,16 @@ std::shared_ptr<CallSpec::OutputSpec> QuillfsRamdiskAdd::GetOutputSpecInternal()
 
 void QuillfsRamdiskAdd::ExecuteInternal(InputPtr input, OutputPtr output) {
     const std::string target = input->GetParameter("target");
-    uint32_t reservedInodes = 0;
-    uint32_t maxInodes = 0;
+    // Taken whole (a negative count as a huge one): the kernel refuses what it cannot hold.
+    uint64_t reservedInodes = 0;
+    uint64_t maxInodes = 0;
     bool coredump = false;
     if (inodeOptions_) {
         if (input->HasParameter("reserved-inodes")) {
-            reservedInodes = static_cast<uint32_t>(input->GetParameterInt("reserved-inodes"));
+            reservedInodes = static_cast<uint64_t>(input->GetParameterInt("reserved-inodes"));
         }
         if (input->HasParameter("max-inodes")) {
-            maxInodes = static_cast<uint32_t>(input->GetParameterInt("max-inodes"));
+            maxInodes = static_cast<uint64_t>(input->GetParameterInt("max-inodes"));
         }
         if (reservedInodes > maxInodes) {
             Fail(*output, "reserved-inodes cannot be greater than max-inodes");

@@ -275,11 +275,17 @@ TEST(QuillfsRamdiskAdd, InodeOptionsWhenSwitchedOn) {
     };
     const auto command = QuillfsRamdiskAdd::New(true);
 
-    for (const auto& values : {with({{"reserved-inodes", "10"}}),
-                               with({{"reserved-inodes", "11"}, {"max-inodes", "10"}})}) {
+    const std::string tooGreat = "reserved-inodes cannot be greater than max-inodes";
+    // Counts are passed whole: one the kernel cannot hold is refused by it, never cut short.
+    const std::pair<std::vector<std::pair<std::string, std::string>>, std::string> refusals[] = {
+        {with({{"reserved-inodes", "10"}}), tooGreat},
+        {with({{"reserved-inodes", "11"}, {"max-inodes", "10"}}), tooGreat},
+        {with({{"reserved-inodes", "10"}, {"max-inodes", "4294967306"}}), std::strerror(EINVAL)},
+        {with({{"reserved-inodes", "10"}, {"max-inodes", "-1"}}), std::strerror(EINVAL)},
+    };
+    for (const auto& [values, message] : refusals) {
         const auto output = Execute(command, values);
-        EXPECT_EQ(output->GetErrorMessages(),
-                  std::vector<std::string>{"reserved-inodes cannot be greater than max-inodes"});
+        EXPECT_EQ(output->GetErrorMessages(), std::vector<std::string>{message});
         EXPECT_FALSE(output->GetRootObject());
         EXPECT_FALSE(output->IsComplete());
     }

@@ -1,7 +1,9 @@
 // Every platform operation that can fail, armed in every command that reaches it: the command
 // reports the injected message the way its description says, with the right exit status, and
-// never crashes. Which commands reach which operation is learned by tracing (BRIXSIM_TRACE_OPS)
-// a table of sample invocations that covers every leaf of the command tree.
+// never crashes, and a command that fails leaves the host's export as it was, but for what an
+// earlier call of the command leaves standing (the failure table of docs/simulator.md). Which
+// commands reach which operation is learned by tracing (BRIXSIM_TRACE_OPS) a table of sample
+// invocations that covers every leaf of the command tree.
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 #include <stdlib.h>
@@ -12,6 +14,7 @@
 #include <filesystem>
 #include <fstream>
 #include <map>
+#include <nlohmann/json.hpp>
 #include <set>
 #include <sstream>
 #include <string>
@@ -110,6 +113,7 @@ const std::vector<Sample>& Samples() {
         {"system coredump file add -a"},
         {"system coredump file remove -F"},
         {"system coredump file remove -f /datastores/ds-shared-02/coredump/coredump-1.dumpfile"},
+        {"system coredump file remove", "system coredump file set -e false"},
         {"system coredump file list"},
         {"system coredump dorna get"},
         {"system coredump dorna set -U b81f04d6-2e7c-4a93-9d58-16fa0c3e72ab"},
@@ -121,6 +125,7 @@ const std::vector<Sample>& Samples() {
         {"system coredump dorna add -s 200 -e true"},
         {"system coredump dorna add -a"},
         {"system coredump dorna remove -F"},
+        {"system coredump dorna remove", "system coredump dorna set -e false"},
         {"system coredump dorna remove -u b81f04d6-2e7c-4a93-9d58-16fa0c3e72ab"},
         {"system coredump dorna list"},
         {"system secpolicy domain list"},
@@ -244,6 +249,63 @@ const std::vector<Expectation>& Expectations() {
     return expectations;
 }
 
+// What a failing command leaves behind where an earlier call of it stands, as the failure table
+// of docs/simulator.md says: the entries of the export that differ from before the command
+// (see Changes). A failure that no entry names leaves nothing.
+struct Remains {
+    const char* line;  // the sample's command line
+    const char* op;    // the failing operation
+    std::vector<std::string> changed;
+};
+
+const std::vector<Remains>& Remainders() {
+    static const std::vector<Remains> remainders = {
+        // Deactivated before the unconfigure failed.
+        {"system coredump partition set -u",
+         "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticPartition",
+         {"tables|host|coredump.partition.active"}},
+        {"system coredump file set -u",
+         "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticFile",
+         {"tables|host|coredump.file.active"}},
+        {"system coredump file remove -F",
+         "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticFile",
+         {"tables|host|coredump.file.active"}},
+        {"system coredump dorna set -u",
+         "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticDorna",
+         {"tables|host|coredump.dorna.active"}},
+        {"system coredump dorna remove -F",
+         "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticDorna",
+         {"tables|host|coredump.dorna.active"}},
+        // Unconfigured, and deactivated, before the read count or the removal failed.
+        {"system coredump file remove",
+         "KernCtl::Storage::StorageInfoImpl::GetDumpFileReadCount",
+         {"tables|host|coredump.file.configured"}},
+        {"system coredump dorna remove",
+         "KernCtl::Storage::StorageInfoImpl::GetDumpDornaReadCount",
+         {"tables|host|coredump.dorna.configured"}},
+        {"system coredump dorna remove",
+         "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove",
+         {"tables|host|coredump.dorna.configured"}},
+        {"system coredump dorna remove -F",
+         "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove",
+         {"tables|host|coredump.dorna.active", "tables|host|coredump.dorna.configured"}},
+        // Stored before loading it failed.
+        {"system settings keyboard layout set -l Belgian",
+         "KernCtl::System::SystemInfoImpl::LoadKeyboardMappings",
+         {"tables|host|keyboard.layout"}},
+    };
+    return remainders;
+}
+
+// The index of the entry for a sample's line and a failing operation, or -1 for "nothing".
+int RemainderFor(const std::string& line, const std::string& op) {
+    const auto& remainders = Remainders();
+    for (size_t i = 0; i < remainders.size(); ++i) {
+        if (line == remainders[i].line && op == remainders[i].op) return static_cast<int>(i);
+    }
+    return -1;
+}
+
 // Operations that no command of the tree reaches, and why.
 const std::map<std::string, std::string>& Unreached() {
     static const char* kLogLevels = "the kernel log-level commands are built but not attached";
@@ -323,6 +385,49 @@ std::string Expected(const Expectation& expectation, const std::string& message,
     return Summary(baseline);
 }
 
+using nlohmann::json;
+
+// Adds to `out` what differs between two parts of an export: a row (an element of an array) that
+// changed, came or went by `name`|<its first member>, anything else by its path of members.
+void Differences(const std::string& name, const json& before, const json& after,
+                 std::set<std::string>& out) {
+    if (before == after) return;
+    const auto below = [&](const std::string& part) {
+        return name.empty() ? part : name + "|" + part;
+    };
+    if (before.is_object() && after.is_object()) {
+        for (const auto* side : {&before, &after}) {
+            for (const auto& [member, unused] : side->items()) {
+                Differences(below(member), before.value(member, json()),
+                            after.value(member, json()), out);
+            }
+        }
+    } else if (before.is_array() && after.is_array()) {
+        for (const auto& [side, other] : {std::pair(&before, &after), std::pair(&after, &before)}) {
+            for (const auto& row : *side) {
+                if (std::find(other->begin(), other->end(), row) != other->end()) continue;
+                const json& first = row.is_object() && !row.empty() ? row.front() : row;
+                out.insert(below(first.is_string() ? first.get<std::string>() : first.dump()));
+            }
+        }
+    } else {
+        out.insert(name);
+    }
+}
+
+// The entries that differ between two exports, leaving out the runs' bookkeeping (the journal
+// and the armed faults), sorted.
+std::vector<std::string> Changes(json before, json after) {
+    for (auto* document : {&before, &after}) {
+        if (!document->contains("tables")) continue;
+        (*document)["tables"].erase("journal");
+        (*document)["tables"].erase("faults");
+    }
+    std::set<std::string> changed;
+    Differences("", before, after, changed);
+    return {changed.begin(), changed.end()};
+}
+
 // Runs `work(item, worker)` for items 0..count-1 on `workers` threads.
 template <class Work>
 void InParallel(size_t count, size_t workers, const Work& work) {
@@ -346,6 +451,13 @@ RunResult RunOn(const fs::path& root, const std::string& line, const fs::path& t
     argv.push_back(BrixRobust::Program("brixcli"));
     for (auto& word : Words(line)) argv.push_back(word);
     return BrixTest::Run(argv);
+}
+
+// The export of the host at `root`, or null when it cannot be read.
+json ExportOf(const fs::path& root) {
+    const auto run = BrixTest::Run(
+        {"env", "BRIX_HOST_ROOT=" + root.string(), BrixRobust::Program("brixsim"), "export"});
+    return run.status == 0 ? json::parse(run.out, nullptr, false) : json();
 }
 
 // Arms the fault straight in the store's table, without waiting for the disk: the sweep needs
@@ -383,9 +495,11 @@ struct FaultCase {
     size_t sample;
     std::string op;
     int expectation;
+    int remainder;  // what a failure leaves behind, or -1 for nothing
     std::string message, detail;
     RunResult run;
     std::string failure;
+    json before, after;  // the exports around the run
 };
 
 // The sweep's hosts: a template prepared once, and one work root per thread, reset from the
@@ -466,11 +580,13 @@ class FaultSweep : public ::testing::Test {
         const Sample& sample = Samples()[item.sample];
         item.failure = Reset(worker, sample);
         if (!item.failure.empty()) return;
+        item.before = ExportOf(roots_[worker]);
         if (!Arm(roots_[worker], item.op, item.message, item.detail)) {
             item.failure = "cannot arm the fault";
             return;
         }
         item.run = RunOn(roots_[worker], sample.line);
+        if (item.run.status != 0) item.after = ExportOf(roots_[worker]);
     }
 
     TempHost host_;
@@ -525,15 +641,19 @@ TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
             EXPECT_TRUE(allOps.count(op)) << op << " is traced but not in fault ops";
             reached.insert(op);
             const int expectation = ExpectationFor(samples[i].line, op);
-            const std::string key =
-                CommandPath(Words(samples[i].line)) + "|" + op + "|" + std::to_string(expectation);
+            const int remainder = RemainderFor(samples[i].line, op);
+            const std::string key = CommandPath(Words(samples[i].line)) + "|" + op + "|" +
+                                    std::to_string(expectation) + "|" + std::to_string(remainder);
             if (!done.insert(key).second) continue;
             const std::string number = std::to_string(cases.size() + 1);
             cases.push_back({i,
                              op,
                              expectation,
+                             remainder,
                              "Injected fault " + number + " of " + op,
                              "detail " + number,
+                             {},
+                             {},
                              {},
                              {}});
         }
@@ -542,6 +662,7 @@ TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
     InParallel(cases.size(), workers_, [&](size_t i, size_t worker) { RunCase(worker, cases[i]); });
 
     std::set<int> used;
+    std::set<size_t> remaindersUsed;
     for (const auto& item : cases) {
         SCOPED_TRACE(samples[item.sample].line + std::string(" with ") + item.op);
         ASSERT_EQ(item.failure, "");
@@ -558,6 +679,16 @@ TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
             EXPECT_EQ(Summary(item.run),
                       Expected(expectation, item.message, item.detail, baseline));
         }
+        // A failed command changed nothing, or only what its table entry says stands.
+        if (item.run.status == 0) continue;
+        ASSERT_FALSE(item.before.is_discarded() || item.before.is_null());
+        ASSERT_FALSE(item.after.is_discarded() || item.after.is_null());
+        std::vector<std::string> remains;
+        if (item.remainder >= 0) {
+            remains = Remainders()[static_cast<size_t>(item.remainder)].changed;
+            remaindersUsed.insert(static_cast<size_t>(item.remainder));
+        }
+        EXPECT_EQ(Changes(item.before, item.after), remains);
     }
     std::cerr << "fault sweep: " << samples.size() << " invocations, " << cases.size()
               << " cases on " << workers_ << " threads\n";
@@ -567,6 +698,10 @@ TEST_F(FaultSweep, EveryCommandReportsEveryFaultOfItsOperations) {
         EXPECT_TRUE(used.count(static_cast<int>(i)))
             << "expectation for " << Expectations()[i].invocation << " " << Expectations()[i].op
             << " matches no case";
+    }
+    for (size_t i = 0; i < Remainders().size(); ++i) {
+        EXPECT_TRUE(remaindersUsed.count(i)) << "remainder for " << Remainders()[i].line << " with "
+                                             << Remainders()[i].op << " matches no failing case";
     }
     // Every operation is reached, or listed with the reason why not.
     for (const auto& op : allOps) {

@@ -140,6 +140,7 @@ struct SetCase {
     const char* name;
     std::vector<std::string> args;
     std::string message;
+    const char* fault = nullptr;  // an operation made to fail with "commit refused"
 };
 
 // Test output names the row instead of dumping its bytes.
@@ -155,6 +156,7 @@ class AdvancedSetRefusals : public testing::TestWithParam<SetCase> {
 TEST_P(AdvancedSetRefusals, ReportsAndChangesNothing) {
     const auto& c = GetParam();
     const auto before = Json(host, kList).out;
+    if (c.fault) host.Fault(c.fault, "commit refused");
     const auto run = Json(host, With(kSet, c.args));
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(run.err, c.message + "\n");
@@ -201,6 +203,23 @@ const SetCase kRefusals[] = {
     {"BadCharacter",
      {"-o", "/Misc/HostName", "-s", "my host"},
      "Invalid value 'my host' for option /Misc/HostName (character ' ' is not allowed)"},
+    // The changes staged before a failing call never reach the host.
+    {"ApplyChangeFailsAfterInt",
+     {"-o", "/BufferCache/FlushIntervalMs", "-i", "100"},
+     "commit refused",
+     "KernCtl::Adv::AdvancedOptionImpl::ApplyChange"},
+    {"ApplyChangeFailsAfterString",
+     {"-o", "/Misc/HostName", "-s", "node7"},
+     "commit refused",
+     "KernCtl::Adv::AdvancedOptionImpl::ApplyChange"},
+    {"ApplyChangeFailsAfterReset",
+     {"-o", "/UserVars/SuppressShellWarning", "-d"},
+     "commit refused",
+     "KernCtl::Adv::AdvancedOptionImpl::ApplyChange"},
+    {"ClearOverrideFailsAfterReset",
+     {"-o", "/UserVars/SuppressShellWarning", "-d"},
+     "commit refused",
+     "KernCtl::Adv::AdvancedOptionImpl::ClearOverride"},
     {"ResetWithoutHandler",
      {"-o", "/Misc/LegacyTimerCalibration", "-d"},
      "Unable to reset option /Misc/LegacyTimerCalibration (the option's value handler is not "
