@@ -1,6 +1,8 @@
 // Call descriptions and the per-invocation Input and Output.
 #include "cmdkit/CallSpec.h"
 
+#include <re2/re2.h>
+
 #include <boost/algorithm/string/case_conv.hpp>
 #include <charconv>
 #include <regex>
@@ -38,6 +40,40 @@ std::optional<bool> ParseBool(const std::string& text) {
     return std::nullopt;
 }
 
+namespace {
+
+// Bytes, as the ECMAScript matcher of std::regex<char> reads them; errors are reported by
+// RegexProblem, not logged.
+RE2::Options MatcherOptions() {
+    RE2::Options options;
+    options.set_encoding(RE2::Options::EncodingLatin1);
+    options.set_log_errors(false);
+    return options;
+}
+
+}  // namespace
+
+std::string RegexProblem(const std::string& pattern) {
+    // The ECMAScript check stays: a pattern is documented and read as ECMAScript. Only the
+    // pattern is compiled here, never a value.
+    try {
+        std::regex check(pattern, std::regex::ECMAScript);
+    } catch (const std::regex_error& error) {
+        return error.what();
+    }
+    RE2 matcher(pattern, MatcherOptions());
+    if (!matcher.ok()) return matcher.error();
+    return std::string();
+}
+
+bool MatchesWhole(const std::string& pattern, const std::string& value) {
+    RE2 matcher(pattern, MatcherOptions());
+    if (!matcher.ok()) {
+        throw CmdKitException("Invalid regular expression " + pattern + ": " + matcher.error());
+    }
+    return RE2::FullMatch(value, matcher);
+}
+
 }  // namespace Detail
 
 namespace CallSpec {
@@ -60,10 +96,8 @@ void ParameterConstraint::SetIntRange(int64_t min, int64_t max) {
 }
 
 void ParameterConstraint::SetStringRegex(const std::string& pattern) {
-    try {
-        std::regex check(pattern, std::regex::ECMAScript);
-    } catch (const std::regex_error& error) {
-        throw CmdKitException("Invalid regular expression " + pattern + ": " + error.what());
+    if (const std::string problem = Detail::RegexProblem(pattern); !problem.empty()) {
+        throw CmdKitException("Invalid regular expression " + pattern + ": " + problem);
     }
     regex_ = pattern;
 }

@@ -7,11 +7,11 @@
 
 #include <algorithm>
 #include <atomic>
-#include <atomic>
 #include <cstdlib>
 #include <iostream>
 
 #include "Internal.h"
+#include "cmdkit/Text.h"
 
 namespace CmdKit::AutoCli {
 
@@ -70,7 +70,8 @@ bool TakeGlobal(const std::vector<std::string>& args, size_t& i, Globals& global
         }
         const auto& shells = CompletionShells();
         if (std::find(shells.begin(), shells.end(), shell) == shells.end()) {
-            throw UsageError("Error: Unknown shell " + shell + " (one of: " + ShellList() + ")");
+            throw UsageError("Error: Unknown shell " + MessageExcerpt(shell) +
+                             " (one of: " + ShellList() + ")");
         }
         globals.completionShell = shell;
         return true;
@@ -86,7 +87,8 @@ bool TakeGlobal(const std::vector<std::string>& args, size_t& i, Globals& global
                 "Error: Missing value for --formatter (one of: " + std::string(kFormatters) + ")");
         }
         if (!Detail::IsFormatterName(name)) {
-            throw UsageError("Error: Unknown formatter " + name + " (one of: " + kFormatters + ")");
+            throw UsageError("Error: Unknown formatter " + MessageExcerpt(name) +
+                             " (one of: " + kFormatters + ")");
         }
         globals.formatter = name;
         return true;
@@ -133,6 +135,12 @@ std::string ChildList(const NamespaceNode& node) {
     return text.empty() ? "(none)" : text;
 }
 
+// A command's messages, each on its own line whatever it holds.
+void WriteMessages(const CallSpec::Output& output, std::ostream& err) {
+    for (const auto& message : output.GetErrorMessages())
+        err << Detail::MessageLine(message) << '\n';
+}
+
 int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
         std::ostream& out, std::ostream& err, bool execute) {
     Globals globals;
@@ -140,7 +148,8 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
     // Global options before the path.
     while (i < args.size() && !args[i].empty() && args[i][0] == '-') {
         if (!TakeGlobal(args, i, globals)) {
-            throw UsageError("Error: Unknown option " + args[i].substr(0, args[i].find('=')));
+            throw UsageError("Error: Unknown option " +
+                             MessageExcerpt(args[i].substr(0, args[i].find('='))));
         }
         ++i;
     }
@@ -152,7 +161,8 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
         auto child = node->GetNamespaceNode(word);
         if (!child) {
             std::string path = node->GetPathString(' ');
-            std::string full = path.empty() ? word : path + " " + word;
+            const std::string shown = MessageExcerpt(word);
+            std::string full = path.empty() ? shown : path + " " + shown;
             err << "Error: Unknown command or namespace " << full << '\n';
             err << "Valid choices" << (path.empty() ? "" : " under " + path) << ": "
                 << ChildList(*node) << '\n';
@@ -218,7 +228,8 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
         if (!rest.empty()) {
             const std::string& word = rest.front();
             if (!word.empty() && word[0] == '-') {
-                err << "Error: Unknown option " << word.substr(0, word.find('=')) << '\n';
+                err << "Error: Unknown option " << MessageExcerpt(word.substr(0, word.find('=')))
+                    << '\n';
                 return 2;
             }
         }
@@ -239,16 +250,16 @@ int Run(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::strin
     try {
         CurrentExecutionScope()([&] { command.GetDispatcher()->Execute(input, output); });
     } catch (const std::exception& error) {
-        for (const auto& message : output->GetErrorMessages()) err << message << '\n';
-        err << "Error: " << error.what() << '\n';
+        WriteMessages(*output, err);
+        err << Detail::MessageLine(std::string("Error: ") + error.what()) << '\n';
         return 1;
     } catch (...) {
-        for (const auto& message : output->GetErrorMessages()) err << message << '\n';
+        WriteMessages(*output, err);
         err << "Error: the command failed with an unknown exception\n";
         return 1;
     }
 
-    for (const auto& message : output->GetErrorMessages()) err << message << '\n';
+    WriteMessages(*output, err);
     if (const auto& result = output->GetRootObject()) {
         std::string formatter = globals.formatter;
         if (formatter.empty()) formatter = command.GetDefaultOutputFormatter();
@@ -273,7 +284,7 @@ int Guarded(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::s
         err << error.what() << '\n';
         return 2;
     } catch (const std::exception& error) {
-        err << "Error: " << error.what() << '\n';
+        err << Detail::MessageLine(std::string("Error: ") + error.what()) << '\n';
         return 1;
     }
 }

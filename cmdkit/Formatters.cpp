@@ -114,7 +114,7 @@ std::string InlineText(const MetaObject* object) {
     if (!object) return std::string();
     switch (object->GetMetaType()) {
         case MetaObj::META_STRING:
-            return static_cast<const MetaString*>(object)->GetValue();
+            return PrintableText(static_cast<const MetaString*>(object)->GetValue());
         case MetaObj::META_INT:
             return IntText(*static_cast<const MetaInt*>(object));
         case MetaObj::META_BOOL:
@@ -151,6 +151,14 @@ std::string WithUnit(const std::string& text, const Hints& hints, const std::str
 
 // --- simple ---
 
+// A carriage return would move a terminal's cursor back over what the line already shows.
+std::string ScreenText(std::string text) {
+    for (size_t at = text.find('\r'); at != std::string::npos; at = text.find('\r', at)) {
+        text.replace(at, 1, "\xEF\xBF\xBD");
+    }
+    return text;
+}
+
 void SimpleStruct(const MetaStruct& object, const MetaStruct* prototype, const Hints& hints,
                   size_t indent, bool nested, std::ostream& out);
 
@@ -173,7 +181,7 @@ void SimpleField(const std::string& name, const MetaObject* value, const MetaObj
         }
         return;
     }
-    const std::string text = WithUnit(InlineText(value), hints, structName, name);
+    const std::string text = ScreenText(WithUnit(InlineText(value), hints, structName, name));
     out << pad << name << ":";
     if (!text.empty()) out << ' ' << text;
     out << '\n';
@@ -206,13 +214,13 @@ void FormatSimple(const MetaObject& result, const FormatContext& context, std::o
                 if (!first) out << '\n';
                 SimpleStruct(*row, prototype, context.hints, 0, false, out);
             } else {
-                out << InlineText(element.get()) << '\n';
+                out << ScreenText(InlineText(element.get())) << '\n';
             }
             first = false;
         }
         return;
     }
-    out << InlineText(&result) << '\n';
+    out << ScreenText(InlineText(&result)) << '\n';
 }
 
 // --- table ---
@@ -373,7 +381,7 @@ void ToXml(const MetaObject* object, const MetaObject* prototype, pugi::xml_node
     switch (object->GetMetaType()) {
         case MetaObj::META_STRING:
             parent.append_child("string").text().set(
-                static_cast<const MetaString*>(object)->GetValue().c_str());
+                PrintableText(static_cast<const MetaString*>(object)->GetValue()).c_str());
             return;
         case MetaObj::META_INT: {
             auto node = parent.append_child("integer");
@@ -400,16 +408,35 @@ void ToXml(const MetaObject* object, const MetaObject* prototype, pugi::xml_node
             const auto* structure = static_cast<const MetaStruct*>(object);
             const MetaStruct* declared = AsStruct(prototype);
             auto node = parent.append_child("structure");
-            node.append_attribute("typeName") = structure->GetName().c_str();
+            node.append_attribute("typeName") = PrintableText(structure->GetName()).c_str();
             for (const auto* field : AllFields(*structure, declared)) {
                 auto fieldNode = node.append_child("field");
-                fieldNode.append_attribute("name") = field->name.c_str();
+                fieldNode.append_attribute("name") = PrintableText(field->name).c_str();
                 ToXml(field->value.get(), DeclaredField(declared, field->name), fieldNode);
             }
             return;
         }
     }
 }
+
+// Passes the document on, with a carriage return in text as `&#13;`: the writer leaves a raw one,
+// which any reader turns into a line feed.
+class XmlWriter : public pugi::xml_writer {
+  public:
+    explicit XmlWriter(std::ostream& out) : out_(out) {}
+    void write(const void* data, size_t size) override {
+        std::string_view text(static_cast<const char*>(data), size);
+        for (size_t at = text.find('\r'); at != std::string_view::npos; at = text.find('\r')) {
+            out_.write(text.data(), static_cast<std::streamsize>(at));
+            out_ << "&#13;";
+            text.remove_prefix(at + 1);
+        }
+        out_.write(text.data(), static_cast<std::streamsize>(text.size()));
+    }
+
+  private:
+    std::ostream& out_;
+};
 
 // --- csv ---
 
@@ -482,6 +509,8 @@ std::string Escape(const std::string& text) {
             escaped += "\\\\";
         } else if (c == '\n') {
             escaped += "\\n";
+        } else if (c == '\r') {
+            escaped += "\\r";
         } else {
             escaped += c;
         }
@@ -565,7 +594,8 @@ void Format(const std::string& formatter, const MetaObj::MetaObject& result,
     } else if (formatter == "xml") {
         pugi::xml_document document;
         ToXml(&result, context.prototype.get(), document.append_child("output"));
-        document.save(out, "  ", pugi::format_default, pugi::encoding_utf8);
+        XmlWriter writer(out);
+        document.save(writer, "  ", pugi::format_default, pugi::encoding_utf8);
     } else if (formatter == "csv") {
         FormatCsv(result, context, out);
     } else if (formatter == "keyvalue") {

@@ -5,6 +5,7 @@
 #include <map>
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "cmdkit/AutoCli.h"
@@ -45,5 +46,14 @@ const std::vector<std::string>& FormatterNames();
 // Writes `result` (non-null) with the named formatter.
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out);
+
+// `text` as valid UTF-8 without control characters: each ill-formed UTF-8 sequence, each
+// control character (C0, DEL, C1) not in `kept` and the noncharacters U+FFFE and U+FFFF become
+// U+FFFD.
+std::string PrintableText(std::string_view text, std::string_view kept = "\t\n\r");
+
+// A message as the tool prints it: on one line, escaped as MessageExcerpt does, cut after 1024
+// characters.
+std::string MessageLine(std::string_view message);
 
 }  // namespace CmdKit::Detail

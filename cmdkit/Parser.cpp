@@ -1,9 +1,8 @@
 // Parsing and checking a command's option words against its declared input.
-#include <regex>
-
 #include "Internal.h"
 #include "Values.h"
 #include "cmdkit/Cli.h"
+#include "cmdkit/Text.h"
 
 namespace CmdKit {
 
@@ -48,10 +47,11 @@ std::string BothNames(const CallSpec::ParameterSpec& parameter) {
     throw UsageError("Error: " + message);
 }
 
-// "Invalid value for --name: <value> <reason>", with a secret value never shown.
+// "Invalid value for --name: <value> <reason>", with a secret value never shown and any other
+// quoted as a short excerpt.
 [[noreturn]] void RefuseValue(const CallSpec::ParameterSpec& parameter, const std::string& value,
                               const std::string& reason) {
-    const std::string shown = parameter.IsSecret() ? "the given value" : value;
+    const std::string shown = parameter.IsSecret() ? "the given value" : MessageExcerpt(value);
     Refuse("Invalid value for " + OptionName(parameter) + ": " + shown + " " + reason);
 }
 
@@ -110,14 +110,7 @@ void CheckConstraint(const CallSpec::ParameterSpec& parameter, const std::string
             RefuseValue(parameter, value, "is not one of: " + JoinEnum(*constraint));
         }
         case CallSpec::CONSTRAINT_REGEX: {
-            std::regex pattern;
-            try {
-                pattern.assign(constraint->GetRegex(), std::regex::ECMAScript);
-            } catch (const std::regex_error& error) {
-                throw CmdKitException("Invalid regular expression for " + OptionName(parameter) +
-                                      ": " + error.what());
-            }
-            if (!std::regex_match(value, pattern)) {
+            if (!Detail::MatchesWhole(constraint->GetRegex(), value)) {
                 RefuseValue(parameter, value,
                             "does not match the pattern " + constraint->GetRegex());
             }
@@ -136,12 +129,12 @@ std::shared_ptr<CallSpec::Input> ParseArguments(const CallSpec::InputSpec& spec,
     for (size_t i = 0; i < args.size(); ++i) {
         const std::string& word = args[i];
         if (word.size() < 2 || word[0] != '-') {
-            Refuse("Unexpected argument " + word);
+            Refuse("Unexpected argument " + MessageExcerpt(word));
         }
         bool hasInlineValue = false;
         auto parameter = Detail::FindOption(spec, word, hasInlineValue);
         if (!parameter) {
-            Refuse("Unknown option " + word.substr(0, word.find('=')));
+            Refuse("Unknown option " + MessageExcerpt(word.substr(0, word.find('='))));
         }
         std::string value;
         if (parameter->GetType() == CallSpec::PARAM_FLAG) {

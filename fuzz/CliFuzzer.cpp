@@ -1,6 +1,8 @@
 // The tool's side of an invocation against the real `system` tree: global options, path
 // resolution, help, the command list and the parsing of a command's arguments. Input: the words
-// after the program name, one per line (or NUL-separated). Commands are never executed.
+// after the program name, one per line (or NUL-separated). Commands are never executed. Besides
+// the status, checks that every message is a short line of valid UTF-8 without control
+// characters, whatever the words hold.
 #include <memory>
 #include <sstream>
 
@@ -34,5 +36,16 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     // failure inside the framework or a command's declarations.
     BRIX_FUZZ_CHECK(status == 0 || status == 2, err.str());
     BRIX_FUZZ_CHECK((status == 2) == !err.str().empty(), err.str());
+    // Whatever the words hold, the messages are short lines of valid UTF-8 without control
+    // characters: a word is quoted as an escaped excerpt.
+    const std::string messages = err.str();
+    BRIX_FUZZ_CHECK(BrixFuzz::ValidUtf8(messages), messages);
+    size_t lineStart = 0;
+    for (size_t i = 0; i < messages.size(); ++i) {
+        const auto c = static_cast<unsigned char>(messages[i]);
+        BRIX_FUZZ_CHECK((c >= 0x20 && c != 0x7F) || c == '\n', messages);
+        if (c == '\n') lineStart = i + 1;
+        BRIX_FUZZ_CHECK(i - lineStart < 2048, messages);
+    }
     return 0;
 }

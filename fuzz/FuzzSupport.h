@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <nlohmann/json.hpp>
 #include <string>
 #include <string_view>
 #include <system_error>
@@ -26,6 +27,16 @@ namespace BrixFuzz {
     do {                                                          \
         if (!(condition)) ::BrixFuzz::Fail(#condition, (detail)); \
     } while (false)
+
+// Whether `text` is well-formed UTF-8: the strict JSON encoder refuses anything else.
+inline bool ValidUtf8(const std::string& text) {
+    try {
+        (void)nlohmann::json(text).dump();
+        return true;
+    } catch (const nlohmann::json::type_error&) {
+        return false;
+    }
+}
 
 inline std::string_view Text(const uint8_t* data, size_t size) {
     return {reinterpret_cast<const char*>(data), size};

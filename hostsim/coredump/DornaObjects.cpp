@@ -5,6 +5,7 @@
 #include <optional>
 #include <random>
 
+#include "cmdkit/Text.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -102,7 +103,7 @@ std::optional<DornaRow> FindObject(Store& store, const std::string& uuid) {
 
 void RequireObject(Store& store, const std::string& uuid) {
     if (!FindObject(store, uuid))
-        throw HostCtlException("Dorna dump object " + uuid + " not found.");
+        throw HostCtlException("Dorna dump object " + CmdKit::MessageExcerpt(uuid) + " not found.");
 }
 
 std::string CreateObject(Store& store, uint64_t sizeMb) {
@@ -167,7 +168,9 @@ int64_t DiagnosticDornaImpl::GetSize() const {
     auto& store = Store::Get();
     store.Check(kGetSize);
     const auto row = FindObject(store, uuid_);
-    if (!row) throw HostCtlException("Dorna dump object " + uuid_ + " not found.");
+    if (!row)
+        throw HostCtlException("Dorna dump object " + CmdKit::MessageExcerpt(uuid_) +
+                               " not found.");
     return row->size;
 }
 

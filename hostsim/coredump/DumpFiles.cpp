@@ -13,6 +13,7 @@
 #include <string>
 #include <system_error>
 
+#include "cmdkit/Text.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -64,18 +65,20 @@ std::string DumpFolder(const std::string& datastore) {
 // temporary file, flushed, then linked into place (never replacing an existing file).
 void WriteDumpFile(Store& store, const std::string& hostPath, uint64_t bytes) {
     const auto target = store.Resolve(hostPath);
-    if (!target) throw HostCtlException("Invalid dump file path " + hostPath + ".");
+    if (!target)
+        throw HostCtlException("Invalid dump file path " + CmdKit::MessageExcerpt(hostPath) + ".");
     std::error_code ec;
     fs::create_directories(target->parent_path(), ec);
     if (ec) {
-        throw HostCtlException("Unable to create folder for " + hostPath + ": " + ec.message());
+        throw HostCtlException("Unable to create folder for " + CmdKit::MessageExcerpt(hostPath) +
+                               ": " + ec.message());
     }
     const fs::path temp = target->parent_path() /
                           ("." + target->filename().string() + ".tmp" + std::to_string(getpid()));
     const int fd = ::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
     if (fd < 0) {
-        throw HostCtlException("Unable to create dump file " + hostPath + ": " +
-                               std::strerror(errno));
+        throw HostCtlException("Unable to create dump file " + CmdKit::MessageExcerpt(hostPath) +
+                               ": " + std::strerror(errno));
     }
     bool ok = ::write(fd, kMagic, sizeof kMagic) == static_cast<ssize_t>(sizeof kMagic) &&
               ::ftruncate(fd, static_cast<off_t>(bytes)) == 0 && ::fsync(fd) == 0;
@@ -87,9 +90,11 @@ void WriteDumpFile(Store& store, const std::string& hostPath, uint64_t bytes) {
     }
     ::unlink(temp.c_str());
     if (!ok) {
-        if (error == EEXIST) throw HostCtlException("Dump file " + hostPath + " already exists.");
-        throw HostCtlException("Unable to create dump file " + hostPath + ": " +
-                               std::strerror(error));
+        if (error == EEXIST)
+            throw HostCtlException("Dump file " + CmdKit::MessageExcerpt(hostPath) +
+                                   " already exists.");
+        throw HostCtlException("Unable to create dump file " + CmdKit::MessageExcerpt(hostPath) +
+                               ": " + std::strerror(error));
     }
     const int dir = ::open(target->parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (dir >= 0) {
@@ -164,7 +169,8 @@ bool IsValidFile(Store& store, const std::string& hostPath, bool checkHeader) {
 // The normal form of a host path given by a user; relative paths are refused.
 std::string NormalPath(const std::string& path) {
     if (path.empty() || path.front() != '/') {
-        throw HostCtlException("Dump file path " + path + " is not an absolute path.");
+        throw HostCtlException("Dump file path " + CmdKit::MessageExcerpt(path) +
+                               " is not an absolute path.");
     }
     std::string normal = fs::path(path).lexically_normal().string();
     while (normal.size() > 1 && normal.back() == '/') normal.pop_back();
@@ -174,7 +180,7 @@ std::string NormalPath(const std::string& path) {
 std::string RequireValid(Store& store, const std::string& path) {
     const std::string normal = NormalPath(path);
     if (!IsValidFile(store, normal, false)) {
-        throw HostCtlException("Dump file " + normal +
+        throw HostCtlException("Dump file " + CmdKit::MessageExcerpt(normal) +
                                " does not exist or is not a valid dump file.");
     }
     return normal;
@@ -190,7 +196,7 @@ void CheckFileName(const std::string& name) {
     if (name.empty() || name.size() > 200 || name.front() == '.' ||
         name.find_first_of("/\\") != std::string::npos ||
         std::any_of(name.begin(), name.end(), [](unsigned char c) { return c < 0x20; })) {
-        throw HostCtlException("Invalid dump file name '" + name + "'.");
+        throw HostCtlException("Invalid dump file name '" + CmdKit::MessageExcerpt(name) + "'.");
     }
 }
 
@@ -209,12 +215,14 @@ std::string CreateFile(Store& store, uint64_t sizeMb, const std::string& datasto
         for (const auto& d : datastores) {
             if (d.name == datastoreName) chosen = &d;
         }
-        if (chosen == nullptr) throw HostCtlException("Datastore " + datastoreName + " not found.");
+        if (chosen == nullptr)
+            throw HostCtlException("Datastore " + CmdKit::MessageExcerpt(datastoreName) +
+                                   " not found.");
         const int64_t free = FreeMb(store, *chosen);
         if (sizeMb > static_cast<uint64_t>(free)) {
-            throw HostCtlException("Insufficient space on datastore " + datastoreName + ": " +
-                                   std::to_string(sizeMb) + " MB needed, " + std::to_string(free) +
-                                   " MB free.");
+            throw HostCtlException(
+                "Insufficient space on datastore " + CmdKit::MessageExcerpt(datastoreName) + ": " +
+                std::to_string(sizeMb) + " MB needed, " + std::to_string(free) + " MB free.");
         }
     } else {
         for (const auto& d : datastores) {

@@ -11,6 +11,7 @@
 #include <chrono>
 #include <cstring>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/Host.h"
 #include "hostctl/HostCtlException.h"
@@ -107,7 +108,8 @@ void SetServer(const char* operation, const std::string& interfaceName, const st
     }
     store.Write([&] {
         if (!HasVnic(store, interfaceName)) {
-            throw HostCtlException("Interface " + interfaceName + " is not a valid vnic.");
+            throw HostCtlException("Interface " + CmdKit::MessageExcerpt(interfaceName) +
+                                   " is not a valid vnic.");
         }
         store.SetValue(kInterfaceKey, interfaceName);
         store.SetValue(kServerKey, server);

@@ -2,6 +2,7 @@
 // the core-dump type, and the active and configured dump partition.
 #include <optional>
 
+#include "cmdkit/Text.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -145,12 +146,15 @@ std::vector<PartitionRow> CoreDumpPartitions(Store& store) {
 // A usable dump partition: exists, has the core-dump type, and its device is online.
 PartitionRow RequireUsable(Store& store, const std::string& name) {
     auto partition = FindPartition(store, name);
-    if (!partition) throw HostCtlException("Partition " + name + " not found.");
+    if (!partition)
+        throw HostCtlException("Partition " + CmdKit::MessageExcerpt(name) + " not found.");
     if (partition->type != kCoreDumpType) {
-        throw HostCtlException("Partition " + name + " is not a diagnostic partition.");
+        throw HostCtlException("Partition " + CmdKit::MessageExcerpt(name) +
+                               " is not a diagnostic partition.");
     }
     if (!partition->online) {
-        throw HostCtlException("Device " + name.substr(0, name.rfind(':')) + " is not accessible.");
+        throw HostCtlException("Device " + CmdKit::MessageExcerpt(name.substr(0, name.rfind(':'))) +
+                               " is not accessible.");
     }
     return *partition;
 }
@@ -160,8 +164,8 @@ std::unique_ptr<DiagnosticPartition> FromSetting(Store& store, const char* key, 
     const std::string name = store.GetValue(key, "");
     if (name.empty()) return nullptr;
     if (!FindPartition(store, name)) {
-        throw HostCtlException(std::string(which) + " diagnostic partition " + name +
-                               " not found.");
+        throw HostCtlException(std::string(which) + " diagnostic partition " +
+                               CmdKit::MessageExcerpt(name) + " not found.");
     }
     return MakePartition(name);
 }

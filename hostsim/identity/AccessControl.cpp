@@ -3,6 +3,7 @@
 // secpolicy_domains.
 #include <string>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/KernAccess.h"
@@ -46,7 +47,8 @@ void CheckLevel(BrixSim::Store& store, const std::string& level) {
     auto all =
         store.Prepare("SELECT keyword FROM secpolicy_keywords WHERE type = 0 ORDER BY value");
     while (all.Step()) valid += (valid.empty() ? "" : ", ") + all.Text(0);
-    throw HostCtl::Lib::HostCtlException("Invalid enforcement level '" + level +
+    throw HostCtl::Lib::HostCtlException("Invalid enforcement level '" +
+                                         CmdKit::MessageExcerpt(level) +
                                          "'. Valid levels are: " + valid + ".");
 }
 
@@ -116,7 +118,8 @@ void KernAccessInterfaceImpl::EnableDomain(const std::string& name, const std::s
         auto known = store.Prepare("SELECT 1 FROM secpolicy_domains WHERE name = ?");
         known.Bind(1, name);
         if (!known.Step()) {
-            throw HostCtl::Lib::HostCtlException("Domain '" + name + "' not found.");
+            throw HostCtl::Lib::HostCtlException("Domain '" + CmdKit::MessageExcerpt(name) +
+                                                 "' not found.");
         }
         store.Prepare("UPDATE secpolicy_domains SET level = ? WHERE name = ?")
             .Bind(1, level)

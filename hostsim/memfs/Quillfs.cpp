@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Hooks.h"
 #include "core/Store.h"
 #include "kernctl/Sysinfo.h"
@@ -180,7 +181,8 @@ void GetRamdisk(const std::vector<std::string>& instancePath, void* buffer, size
         " coredump, system, mount_point, max_inodes, allocated_inodes, used_inodes"
         " FROM quillfs_ramdisks WHERE name = ?");
     row.Bind(1, instancePath[0]);
-    if (!row.Step()) throw HostCtlException("Ramdisk " + instancePath[0] + " not found");
+    if (!row.Step())
+        throw HostCtlException("Ramdisk " + CmdKit::MessageExcerpt(instancePath[0]) + " not found");
     BrixSim::Ksi::RecordWriter record(buffer, size);
     auto u32 = [&](int column) { return static_cast<uint32_t>(row.Int(column)); };
     record.U32(R::kReservedMib, u32(0));
@@ -203,7 +205,8 @@ void GetTardisk(const std::vector<std::string>& instancePath, void* buffer, size
     RequireInstance("system.quillfs.tardisks.stats", instancePath);
     auto row = Store::Get().Prepare("SELECT size, system FROM quillfs_tardisks WHERE name = ?");
     row.Bind(1, instancePath[0]);
-    if (!row.Step()) throw HostCtlException("Tardisk " + instancePath[0] + " not found");
+    if (!row.Step())
+        throw HostCtlException("Tardisk " + CmdKit::MessageExcerpt(instancePath[0]) + " not found");
     BrixSim::Ksi::RecordWriter record(buffer, size);
     // The kernel keeps the size in a 32-bit counter: 4 GiB and more wrap.
     record.U32(T::kBytes, static_cast<uint32_t>(row.Int(0)));

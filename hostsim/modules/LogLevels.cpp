@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Module.h"
@@ -54,9 +55,10 @@ void WriteLevel(Store& store, const char* operation, const std::string& owner,
             store.Prepare("SELECT default_level FROM log_levels WHERE owner = ? AND name = ?");
         row.Bind(1, owner).Bind(2, name);
         if (!row.Step()) {
-            throw HostCtlException(owner.empty() ? "Unknown log level '" + name + "'"
-                                                 : "Unknown log level '" + name + "' of module '" +
-                                                       owner + "'");
+            throw HostCtlException(owner.empty()
+                                       ? "Unknown log level '" + CmdKit::MessageExcerpt(name) + "'"
+                                       : "Unknown log level '" + CmdKit::MessageExcerpt(name) +
+                                             "' of module '" + CmdKit::MessageExcerpt(owner) + "'");
         }
         const int64_t value = level ? static_cast<int64_t>(*level) : row.Int(0);
         store
@@ -77,7 +79,7 @@ void WriteLevel(Store& store, const char* operation, const std::string& owner,
 
 std::string ModuleOwner(Store& store, const std::string& name) {
     auto module = BrixSim::Modules::Resolve(store, name);
-    if (!module) throw HostCtlException("Module '" + name + "' not found");
+    if (!module) throw HostCtlException("Module '" + CmdKit::MessageExcerpt(name) + "' not found");
     return *module;
 }
 

@@ -3,6 +3,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
@@ -44,7 +45,7 @@ const bool registered = BrixSim::RegisterOperations({
 });
 
 HostCtlException NotFound(const std::string& name) {
-    return HostCtlException("Module '" + name + "' not found");
+    return HostCtlException("Module '" + CmdKit::MessageExcerpt(name) + "' not found");
 }
 
 std::unique_ptr<KernCtl::System::ModuleImpl::Record> FindRecord(Store& store,
@@ -216,7 +217,7 @@ void ModuleImpl::Load(const std::string& parameters, bool force) {
         const auto module = Modules::Resolve(store, name_);
         const auto record = module ? FindRecord(store, *module) : nullptr;
         if (!record) {
-            throw HostCtlException("Unable to load module '" + name_ +
+            throw HostCtlException("Unable to load module '" + CmdKit::MessageExcerpt(name_) +
                                    "': no module file found in /usr/lib/brix/kmod");
         }
         if (record->loaded)
@@ -308,8 +309,9 @@ void ModuleImpl::CopyParameters(const std::string& source, const std::vector<std
             const auto found = std::find_if(from.rbegin(), from.rend(),
                                             [&](const auto& pair) { return pair.key == key; });
             if (found == from.rend()) {
-                throw HostCtlException("Parameter '" + key + "' is not configured for module '" +
-                                       source + "'");
+                throw HostCtlException("Parameter '" + CmdKit::MessageExcerpt(key) +
+                                       "' is not configured for module '" +
+                                       CmdKit::MessageExcerpt(source) + "'");
             }
             const auto place = std::find_if(pairs.begin(), pairs.end(),
                                             [&](const auto& pair) { return pair.key == key; });

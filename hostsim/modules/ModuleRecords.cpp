@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "modules/ModuleStore.h"
@@ -71,7 +72,8 @@ std::vector<ParameterPair> ParseParameters(const std::string& text) {
         while (i < text.size() && !isBlank(text[i]) && text[i] != '=') ++i;
         pair.key = text.substr(start, i - start);
         if (pair.key.empty() || pair.key.find('"') != std::string::npos) {
-            throw HostCtl::Lib::HostCtlException("Invalid parameter string '" + text +
+            throw HostCtl::Lib::HostCtlException("Invalid parameter string '" +
+                                                 CmdKit::MessageExcerpt(text) +
                                                  "': a parameter needs a name");
         }
         if (i < text.size() && text[i] == '=') {
@@ -80,13 +82,14 @@ std::vector<ParameterPair> ParseParameters(const std::string& text) {
             if (i < text.size() && text[i] == '"') {
                 const auto close = text.find('"', i + 1);
                 if (close == std::string::npos) {
-                    throw HostCtl::Lib::HostCtlException("Invalid parameter string '" + text +
+                    throw HostCtl::Lib::HostCtlException("Invalid parameter string '" +
+                                                         CmdKit::MessageExcerpt(text) +
                                                          "': unterminated quote");
                 }
                 i = close + 1;
                 if (i < text.size() && !isBlank(text[i])) {
                     throw HostCtl::Lib::HostCtlException(
-                        "Invalid parameter string '" + text +
+                        "Invalid parameter string '" + CmdKit::MessageExcerpt(text) +
                         "': a quoted value must be followed by a blank");
                 }
             } else {

@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Hooks.h"
 #include "core/Store.h"
 #include "kernctl/Sysinfo.h"
@@ -294,7 +295,9 @@ void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t
         row.Bind(1, id);
         if (wellFormed && row.Step()) world = ReadRow(row);
     }
-    if (!world) throw HostCtl::Lib::HostCtlException("World " + instancePath[0] + " not found");
+    if (!world)
+        throw HostCtl::Lib::HostCtlException("World " + CmdKit::MessageExcerpt(instancePath[0]) +
+                                             " not found");
     BrixSim::Ksi::RecordWriter record(buffer, size);
     record.U32(R::kId, world->id);
     record.U32(R::kCartelId, world->cartel);

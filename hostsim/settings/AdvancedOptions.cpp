@@ -4,6 +4,7 @@
 #include <utility>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Adv.h"
@@ -98,7 +99,9 @@ std::unique_ptr<AdvancedOptionImpl> AdvancedOptionImpl::FindOption(const std::st
     auto row =
         store.Prepare(std::string("SELECT ") + kColumns + " FROM adv_options WHERE path = ?");
     row.Bind(1, path);
-    if (!row.Step()) throw HostCtlException("Unable to find option " + path, "Not found");
+    if (!row.Step())
+        throw HostCtlException("Unable to find option " + CmdKit::MessageExcerpt(path),
+                               "Not found");
     return MakeOption(row);
 }
 
@@ -205,8 +208,9 @@ void AdvancedOptionImpl::StoreString(const std::string& value) {
     if (!data_.validCharacters.empty()) {
         const auto bad = value.find_first_not_of(data_.validCharacters);
         if (bad != std::string::npos) {
-            throw HostCtlException("Invalid value '" + value + "' for option " + data_.path,
-                                   "character '" + value.substr(bad, 1) + "' is not allowed");
+            throw HostCtlException(
+                "Invalid value '" + CmdKit::MessageExcerpt(value) + "' for option " + data_.path,
+                "character '" + CmdKit::MessageExcerpt(value.substr(bad, 1)) + "' is not allowed");
         }
     }
     auto& staged = Staged();

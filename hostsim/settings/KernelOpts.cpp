@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "settings/Boot.h"
@@ -155,8 +156,8 @@ bool ParseUnsigned(const std::string& text, uint64_t& value) {
 std::string Validate(const KernCtl::System::KernelOpts::OptionInfo& info,
                      const std::string& value) {
     const auto refuse = [&](const std::string& expected) {
-        return HostCtlException("Invalid value '" + value + "' for kernel setting '" + info.name +
-                                "': expected " + expected);
+        return HostCtlException("Invalid value '" + CmdKit::MessageExcerpt(value) +
+                                "' for kernel setting '" + info.name + "': expected " + expected);
     };
     uint64_t number = 0;
     switch (info.type) {
@@ -227,7 +228,8 @@ void KernelOpts::Load() {
 KernelOpts::OptionInfo& KernelOpts::Find(const std::string& name) {
     Load();
     const auto found = options_.find(name);
-    if (found == options_.end()) throw HostCtlException("Unknown kernel setting '" + name + "'");
+    if (found == options_.end())
+        throw HostCtlException("Unknown kernel setting '" + CmdKit::MessageExcerpt(name) + "'");
     return found->second;
 }
 

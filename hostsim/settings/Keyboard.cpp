@@ -3,6 +3,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
@@ -60,7 +61,8 @@ std::string Known(Store& store, const std::string& name) {
     auto row = store.Prepare("SELECT name FROM keyboard_layouts WHERE name = ?");
     row.Bind(1, name);
     if (!row.Step()) {
-        throw HostCtl::Lib::HostCtlException("Unknown keyboard layout '" + name + "'");
+        throw HostCtl::Lib::HostCtlException("Unknown keyboard layout '" +
+                                             CmdKit::MessageExcerpt(name) + "'");
     }
     return row.Text(0);
 }

@@ -81,7 +81,8 @@ void SnmpAgentGet::ExecuteInternal(InputPtr, OutputPtr output) {
                        key == "loglevel" || key == "authentication" || key == "privacy") {
                 result->SetField(key, value, doc);
             } else {
-                output->AddErrorMessage("Unknown option " + key + " value '" + value + "'");
+                output->AddErrorMessage("Unknown option " + MessageExcerpt(key) + " value '" +
+                                        MessageExcerpt(value) + "'");
             }
         }
 

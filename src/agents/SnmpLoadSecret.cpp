@@ -6,6 +6,7 @@
 #include <cstring>
 #include <fstream>
 
+#include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
 #include "os/HostFiles.h"
 
@@ -24,8 +25,8 @@ std::string LoadSecret(const std::string& name) {
         std::getline(file, line);
     } catch (const std::ios_base::failure&) {
         const int error = errno;
-        throw HostCtl::Lib::HostCtlException("File name '" + name + "' could not be read, " +
-                                             std::strerror(error));
+        throw HostCtl::Lib::HostCtlException("File name '" + CmdKit::MessageExcerpt(name) +
+                                             "' could not be read, " + std::strerror(error));
     }
     boost::trim_left_if(line, boost::is_space());
     boost::trim_right_if(line, boost::is_space());

@@ -48,7 +48,7 @@ void KernelDumpDornaRemove::ExecuteInternal(InputPtr input, OutputPtr output) {
         }
         if (uuid == activeUuid) {
             if (!force) {
-                return Fail(*output, "Dorna dump object " + uuid +
+                return Fail(*output, "Dorna dump object " + MessageExcerpt(uuid) +
                                          " is currently active.  The active Dorna dump object "
                                          "will only be removed if --force is specified.");
             }
@@ -59,19 +59,19 @@ void KernelDumpDornaRemove::ExecuteInternal(InputPtr input, OutputPtr output) {
         if (!force) {
             uint32_t count = 0;
             if (!storage.GetDumpDornaReadCount(uuid, count)) {
-                return Fail(*output, "Dorna dump object " + uuid +
+                return Fail(*output, "Dorna dump object " + MessageExcerpt(uuid) +
                                          " read count could not be determined; Use --force to "
                                          "override check.");
             }
             if (count == 0) {
-                return Fail(*output, "Dorna dump object " + uuid +
+                return Fail(*output, "Dorna dump object " + MessageExcerpt(uuid) +
                                          " not read yet; Use --force to override check.");
             }
         }
         try {
             KernCtl::Storage::DiagnosticDornaImpl(uuid).DumpDornaRemove(uuid);
         } catch (const HostCtl::Lib::HostCtlException&) {
-            return Fail(*output, "Removal of object " + uuid + " failed");
+            return Fail(*output, "Removal of object " + MessageExcerpt(uuid) + " failed");
         }
         Succeed(*output);
     });

@@ -51,8 +51,8 @@ void KernelDumpFileRemove::ExecuteInternal(InputPtr input, OutputPtr output) {
         }
         if (file == activePath) {
             if (!force) {
-                return Fail(*output,
-                            "Dump file " + file + " currently active, --force is required.");
+                return Fail(*output, "Dump file " + MessageExcerpt(file) +
+                                         " currently active, --force is required.");
             }
             storage.DeactivateDiagnosticFile();
         }
@@ -61,17 +61,18 @@ void KernelDumpFileRemove::ExecuteInternal(InputPtr input, OutputPtr output) {
         if (!force) {
             uint32_t count = 0;
             if (!storage.GetDumpFileReadCount(file, count)) {
-                return Fail(*output, "Dump file " + file +
+                return Fail(*output, "Dump file " + MessageExcerpt(file) +
                                          " read count could not be determined; Use --force to "
                                          "override check.");
             }
             if (count == 0) {
-                return Fail(*output,
-                            "Dump file " + file + " not read yet; Use --force to override check.");
+                return Fail(*output, "Dump file " + MessageExcerpt(file) +
+                                         " not read yet; Use --force to override check.");
             }
         }
         if (HostOs::unlink(file.c_str()) != 0) {
-            return Fail(*output, "Unlink of file " + file + " failed: " + std::strerror(errno));
+            return Fail(*output, "Unlink of file " + MessageExcerpt(file) +
+                                     " failed: " + std::strerror(errno));
         }
         Succeed(*output);
     });

@@ -8,11 +8,13 @@
 #include <utility>
 
 #include "cmdkit/AutoCli.h"
+#include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
 
 namespace OstrelCli::System {
 
 namespace CallSpec = CmdKit::CallSpec;
+using CmdKit::MessageExcerpt;
 namespace MetaObj = CmdKit::MetaObj;
 using InputPtr = std::shared_ptr<CmdKit::CallSpec::Input>;
 using OutputPtr = std::shared_ptr<CmdKit::CallSpec::Output>;

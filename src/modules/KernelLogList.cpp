@@ -61,7 +61,7 @@ void KernelLogList::ExecuteInternal(InputPtr input, OutputPtr output) {
             auto module = systemInfo.GetModuleByName(name);
             auto* kernelModule = dynamic_cast<KernCtl::System::ModuleImpl*>(module.get());
             if (kernelModule == nullptr) {
-                Fail(*output, "Could not find module with the name '" + name + "'");
+                Fail(*output, "Could not find module with the name '" + MessageExcerpt(name) + "'");
                 return;
             }
             levels = kernelModule->GetLogLevels();

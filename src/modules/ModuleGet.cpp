@@ -51,7 +51,7 @@ void ModuleGet::ExecuteInternal(InputPtr input, OutputPtr output) {
         const std::string name = input->GetParameter("module");
         KernCtl::System::ModuleImpl module(name);
         if (!KernCtl::System::ModuleImpl::IsValidName(name)) {
-            Fail(*output, "unknown module '" + name + "'");
+            Fail(*output, "unknown module '" + MessageExcerpt(name) + "'");
             return;
         }
         auto details = GetOutputStructure();

@@ -42,7 +42,7 @@ void ModuleLoad::ExecuteInternal(InputPtr input, OutputPtr output) {
             return;
         }
         if (!force && !KernCtl::System::ModuleImpl::IsValidName(name)) {
-            Fail(*output, "unknown module '" + name + "'");
+            Fail(*output, "unknown module '" + MessageExcerpt(name) + "'");
             return;
         }
         const bool enabled = module.GetEnabled();

@@ -46,7 +46,7 @@ void ModuleParametersList::ExecuteInternal(InputPtr input, OutputPtr output) {
         const auto declared = module.GetParameters();
         const auto configured = module.GetOptions();
         if (!KernCtl::System::ModuleImpl::IsValidName(name)) {
-            Fail(*output, "unknown module '" + name + "'");
+            Fail(*output, "unknown module '" + MessageExcerpt(name) + "'");
             return;
         }
         const auto& doc = MetaObj::MetaStruct::_docEmpty;

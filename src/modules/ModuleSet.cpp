@@ -44,7 +44,7 @@ void ModuleSet::ExecuteInternal(InputPtr input, OutputPtr output) {
         }
         KernCtl::System::ModuleImpl module(name);
         if (!force && !KernCtl::System::ModuleImpl::IsValidName(name)) {
-            Fail(*output, "unknown module '" + name + "'");
+            Fail(*output, "unknown module '" + MessageExcerpt(name) + "'");
             return;
         }
         module.SetEnabled(enabled);

@@ -82,8 +82,8 @@ void SettingsAdvancedList::ExecuteInternal(InputPtr input, OutputPtr output) {
             FormatBranch(*branch, *list, delta);
         } else {
             // The caller still receives the (empty) list.
-            output->AddErrorMessage("Invalid value for --tree No tree with the name " + tree +
-                                    " found");
+            output->AddErrorMessage("Invalid value for --tree No tree with the name " +
+                                    MessageExcerpt(tree) + " found");
         }
         Answer(*output, list);
     });

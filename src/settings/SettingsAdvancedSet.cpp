@@ -46,7 +46,7 @@ void SettingsAdvancedSet::ExecuteInternal(InputPtr input, OutputPtr output) {
         }
         auto option = KernCtl::Adv::AdvancedOptionImpl::FindOption(path);
         if (!option) {
-            Fail(*output, "unknown option: " + path);
+            Fail(*output, "unknown option: " + MessageExcerpt(path));
             return;
         }
 
@@ -69,7 +69,8 @@ void SettingsAdvancedSet::ExecuteInternal(InputPtr input, OutputPtr output) {
                 view.SetValue(static_cast<uint32_t>(input->GetParameterInt("int-value")));
             });
             if (!found) {
-                Fail(*output, "unable to access option '" + path + "' as integer option");
+                Fail(*output,
+                     "unable to access option '" + MessageExcerpt(path) + "' as integer option");
                 return;
             }
             if (missingValue) {
@@ -86,7 +87,8 @@ void SettingsAdvancedSet::ExecuteInternal(InputPtr input, OutputPtr output) {
                 view.SetValue(input->GetParameter("string-value"));
             });
             if (!found) {
-                Fail(*output, "unable to access option '" + path + "' as string option");
+                Fail(*output,
+                     "unable to access option '" + MessageExcerpt(path) + "' as string option");
                 return;
             }
             if (missingValue) {
@@ -94,7 +96,8 @@ void SettingsAdvancedSet::ExecuteInternal(InputPtr input, OutputPtr output) {
                 return;
             }
         } else {
-            Fail(*output, "unable to access option '" + path + "' as string or integer option");
+            Fail(*output, "unable to access option '" + MessageExcerpt(path) +
+                              "' as string or integer option");
             return;
         }
         option->ApplyChange();

@@ -18,10 +18,12 @@ std::shared_ptr<CallSpec::InputSpec> MessageSpec() {
     spec->AddParameter(Param("fail", CallSpec::PARAM_FLAG));
     spec->AddParameter(Param("throw", CallSpec::PARAM_FLAG));
     spec->AddParameter(Param("count", CallSpec::PARAM_INT));
+    spec->AddParameter(Param("bounce", CallSpec::PARAM_FLAG));
     return spec;
 }
 
-// Echoes --message; --fail adds two errors (and still answers), --throw throws.
+// Echoes --message; --fail adds two errors (and still answers), --throw throws, --bounce
+// answers only an error that quotes the message as it is.
 std::shared_ptr<FakeCommand> Echo() {
     auto command = FakeCommand::New(
         MessageSpec, MetaObj::MetaString::New(),
@@ -29,6 +31,10 @@ std::shared_ptr<FakeCommand> Echo() {
             if (input.IsFlagSet("throw")) {
                 output.AddErrorMessage("first");
                 throw std::runtime_error("boom");
+            }
+            if (input.IsFlagSet("bounce")) {
+                output.AddErrorMessage("bad: " + input.GetParameter("message"));
+                return;
             }
             if (input.IsFlagSet("fail")) {
                 output.AddErrorMessage("went wrong");
@@ -98,10 +104,28 @@ INSTANTIATE_TEST_SUITE_P(
              "",
              "Error: Unknown command or namespace a x\nValid choices under a: b\n"},
         Case{{"zz"}, 2, "", "Error: Unknown command or namespace zz\nValid choices: a\n"},
-        Case{{"a", "b", "--bogus"}, 2, "", "Error: Unknown option --bogus\n"}),
+        Case{{"a", "b", "--bogus"}, 2, "", "Error: Unknown option --bogus\n"},
+        // Whatever a message quotes, it is printed on one line that cannot steer a terminal.
+        Case{{"a", "b", "cmd", "-m", "x\ny\x1b[2J", "--bounce"}, 1, "", "bad: x\\ny\\x1b[2J\n"},
+        Case{{"--formatter=y\x1bml", "a", "b", "cmd", "-m", "x"},
+             2,
+             "",
+             "Error: Unknown formatter y\\x1bml (one of: simple, table, json, xml, csv, "
+             "keyvalue)\n"},
+        Case{{"a", "x\ny"},
+             2,
+             "",
+             "Error: Unknown command or namespace a x\\ny\nValid choices under a: b\n"}),
     [](const testing::TestParamInfo<Case>& info) {
         return WordsTestName(info.param.args, info.index);
     });
+
+TEST(Cli, LongMessageIsCut) {
+    auto run =
+        Invoke(TreeWith(Echo()), {"a", "b", "cmd", "-m", std::string(2000, 'x'), "--bounce"});
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.err, "bad: " + std::string(1019, 'x') + "... (2005 bytes)\n");
+}
 
 TEST(Cli, NamespaceWithoutCommandShowsHelpAndFails) {
     auto run = Invoke(TreeWith(Echo()), {"a", "b"});

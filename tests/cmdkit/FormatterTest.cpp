@@ -88,6 +88,21 @@ std::string Name(const testing::TestParamInfo<Expectation>& info) {
 
 const Hints kDiskHints = {{"fields:Disk", "Name, Size,Tags"}, {"units:Disk.Size", "KiB"}};
 
+// Stored text may hold anything: control characters (a terminal escape, a carriage return, NUL),
+// bytes that are not UTF-8, the noncharacter U+FFFE and the C1 control U+009B.
+using namespace std::string_literals;
+const std::string kHostile =
+    "a\x01"
+    "b\xff"
+    "c\r"
+    "d\t"
+    "e\x1b[0m"
+    "\xef\xbf\xbe"
+    "\xc2\x9b"
+    "\0"
+    "z"s;
+const std::string kR = "\xef\xbf\xbd";  // U+FFFD, the replacement character
+
 INSTANTIATE_TEST_SUITE_P(
     Table, Formatter,
     testing::Values(
@@ -194,7 +209,33 @@ INSTANTIATE_TEST_SUITE_P(
                     "    <field name=\"Tags\">\n      <list type=\"string\">\n"
                     "        <string>t</string>\n      </list>\n    </field>\n"
                     "  </structure>\n"
-                    "</output>\n"}),
+                    "</output>\n"},
+        Expectation{"HostileSimple",
+                    [] { return MetaObj::MetaString::New(kHostile); },
+                    {},
+                    "simple",
+                    "a" + kR + "b" + kR + "c" + kR + "d\te" + kR + "[0m" + kR + kR + kR + "z\n"},
+        Expectation{"HostileKeyValue",
+                    [] { return MetaObj::MetaString::New(kHostile); },
+                    {},
+                    "keyvalue",
+                    "String=a" + kR + "b" + kR + "c\\rd\te" + kR + "[0m" + kR + kR + kR + "z\n"},
+        Expectation{"HostileCsv",
+                    [] { return MetaObj::MetaString::New(kHostile); },
+                    {},
+                    "csv",
+                    "\"a" + kR + "b" + kR + "c\rd\te" + kR + "[0m" + kR + kR + kR + "z\"\n"},
+        Expectation{"HostileJson",
+                    [] { return MetaObj::MetaString::New(kHostile); },
+                    {},
+                    "json",
+                    "\"a\\u0001b" + kR + "c\\rd\\te\\u001b[0m\xef\xbf\xbe\xc2\x9b\\u0000z\"\n"},
+        Expectation{"HostileXml",
+                    [] { return MetaObj::MetaString::New(kHostile); },
+                    {},
+                    "xml",
+                    "<?xml version=\"1.0\"?>\n<output>\n  <string>a" + kR + "b" + kR +
+                        "c&#13;d\te" + kR + "[0m" + kR + kR + kR + "z</string>\n</output>\n"}),
     Name);
 
 TEST(Json, StructureKeysInDeclaredOrderWithAllFieldsAndExactIntegers) {
@@ -241,6 +282,14 @@ TEST(Table, PrototypeWithoutFieldsTakesColumnsFromTheFirstRow) {
               "Mounted  Name  Size  Tags\n"
               "-------  ----  ----  ----\n"
               "true     d     1\n");
+}
+
+TEST(Table, HostileTextStaysInItsCell) {
+    auto list = MetaObj::MetaList::New(MetaObj::META_STRUCT, DiskPrototype());
+    list->Add(Disk(kHostile, 1, true, {}));
+    auto run = Show(list, nullptr, {{"table-columns", "Mounted,Name"}}, "table");
+    const std::string cell = "a" + kR + "b" + kR + "c d e" + kR + "[0m" + kR + kR + kR + "z";
+    EXPECT_NE(run.out.find("\ntrue     " + cell + "\n"), std::string::npos) << run.out;
 }
 
 TEST(Default, CommandsFormatterUnlessOverridden) {

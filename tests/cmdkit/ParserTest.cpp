@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <climits>
+#include <regex>
 
 #include "FakeCommand.h"
 
@@ -121,7 +122,15 @@ INSTANTIATE_TEST_SUITE_P(
                 "Error: Invalid value for --pin: the given value does not match the pattern "
                 "[0-9]{4}"},
         Refusal{With({"--secretnum", "s3cr3t"}),
-                "Error: Invalid value for --secretnum: the given value is not an integer"}),
+                "Error: Invalid value for --secretnum: the given value is not an integer"},
+        // A quoted value stays on one line and cannot steer a terminal.
+        Refusal{With({"--count", "1\n2\t\r\x1b[2J\x7f"}),
+                "Error: Invalid value for --count: 1\\n2\\t\\r\\x1b[2J\\x7f is not an integer"},
+        Refusal{With({"--mode", "\xff\xc3(\xe2\x80\xaeok\xc2\x9b"}),
+                "Error: Invalid value for --mode: \\xff\\xc3(\\u202eok\\u009b is not one of: fast, "
+                "slow"},
+        Refusal{With({"st\nray"}), "Error: Unexpected argument st\\nray"},
+        Refusal{With({"--fo\x1bo=x\ny"}), "Error: Unknown option --fo\\x1bo"}),
     [](const testing::TestParamInfo<Refusal>& info) {
         return WordsTestName(info.param.args, info.index);
     });
@@ -221,14 +230,88 @@ TEST(Parser, SecretValueNeverInAnyMessage) {
     }
 }
 
+// The longest value one argument can hold: a matcher that recursed per character crashed here.
+TEST(Parser, LongValueIsRefusedQuotingAnExcerpt) {
+    const std::string shown = std::string(128, 'a') + "... (131000 bytes)";
+    const std::vector<std::pair<std::vector<std::string>, std::string>> cases = {
+        {With({"--id", std::string(131000, 'a')}),
+         "Error: Invalid value for --id: " + shown + " does not match the pattern [a-z]+[0-9]"},
+        {With({"--mode", std::string(131000, 'a')}),
+         "Error: Invalid value for --mode: " + shown + " is not one of: fast, slow"},
+        {With({std::string(131000, 'a')}), "Error: Unexpected argument " + shown},
+    };
+    for (const auto& [args, message] : cases) {
+        try {
+            AutoCli::ParseArguments(*TestSpec(), args);
+            ADD_FAILURE() << "accepted";
+        } catch (const CmdKit::UsageError& error) {
+            EXPECT_EQ(error.what(), message);
+        }
+    }
+    auto input =
+        AutoCli::ParseArguments(*TestSpec(), With({"--id", std::string(131000, 'a') + "1"}));
+    EXPECT_EQ(input->GetParameter("id").size(), 131001u);
+}
+
+// The regex constraints, the plug-in's engine id pattern among them, accept exactly what
+// ECMAScript matching of the whole value accepts.
+TEST(Parser, RegexConstraintsMatchAsEcmaScriptDoes) {
+    const std::vector<std::string> patterns = {"(0x|0X|)[0-9a-fA-F:]+", "[a-z]+[0-9]",
+                                               "[0-9]{4}|none", "a(b|c)*d?", "[^:]+:\\d{2,3}"};
+    const std::vector<std::string> values = {"",
+                                             "0x",
+                                             "0x0123456789abcdef",
+                                             "0XAB:cd",
+                                             "deadbeef",
+                                             "0xg1",
+                                             "x0",
+                                             "12 34",
+                                             "0x12\n",
+                                             "ab1",
+                                             "abc",
+                                             "1234",
+                                             "12345",
+                                             "none",
+                                             "nonex",
+                                             "abbcd",
+                                             "ad",
+                                             "a",
+                                             "h:123",
+                                             "h:1",
+                                             ":12",
+                                             "a\xff"
+                                             "1",
+                                             "\xe9\xe9:99"};
+    for (const auto& pattern : patterns) {
+        auto spec = CallSpec::InputSpec::New();
+        auto value = Param("value", CallSpec::PARAM_STRING);
+        value->SetConstraint(Regex(pattern));
+        spec->AddParameter(value);
+        const std::regex ecma(pattern, std::regex::ECMAScript);
+        for (const auto& text : values) {
+            bool accepted = true;
+            try {
+                AutoCli::ParseArguments(*spec, {"--value", text});
+            } catch (const CmdKit::UsageError&) {
+                accepted = false;
+            }
+            EXPECT_EQ(accepted, std::regex_match(text, ecma)) << pattern << " on " << text;
+        }
+    }
+}
+
 TEST(Parser, DeclarationMisuseIsRejected) {
     EXPECT_THROW(CallSpec::ParameterSpec::New("", CallSpec::PARAM_STRING), CmdKit::CmdKitException);
     EXPECT_THROW(CallSpec::ParameterSpec::New("x", 7), CmdKit::CmdKitException);
     EXPECT_THROW(ParameterConstraint::New(2), CmdKit::CmdKitException);
     EXPECT_THROW(ParameterConstraint::New(CallSpec::CONSTRAINT_INT_RANGE)->SetIntRange(5, 4),
                  CmdKit::CmdKitException);
-    EXPECT_THROW(ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX)->SetStringRegex("(["),
-                 CmdKit::CmdKitException);
+    // Not ECMAScript, or beyond a matcher linear in the value: refused when declared.
+    for (const char* pattern : {"([", "(a)\\1", "(?=a)a", "(?i)a", "a{1001}"}) {
+        EXPECT_THROW(ParameterConstraint::New(CallSpec::CONSTRAINT_REGEX)->SetStringRegex(pattern),
+                     CmdKit::CmdKitException)
+            << pattern;
+    }
     auto spec = CallSpec::InputSpec::New();
     spec->AddParameter(Param("one", CallSpec::PARAM_STRING, "o"));
     EXPECT_THROW(spec->AddParameter(Param("one", CallSpec::PARAM_INT)), CmdKit::CmdKitException);

@@ -91,6 +91,8 @@ void CheckRunPaths(const fs::path& prefix) {
         {"bin/brixcli", "$ORIGIN/../lib"},
         {"bin/brixsim", "$ORIGIN/../lib"},
         {"bin/brixsim-mgmt-cmd", "$ORIGIN/../lib"},
+        {"lib/libcmdkit.so", "$ORIGIN/../lib"},
+        {"lib/libbrixhost.so", "$ORIGIN/../lib"},
         {"lib/brixcli/plugins/libbrixcli-system.so", "$ORIGIN/../.."},
         {"lib/brixcli/plugins/libbrixcli-hello.so", "$ORIGIN/../.."},
     };

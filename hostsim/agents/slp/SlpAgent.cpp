@@ -28,6 +28,7 @@
 
 #include "agents/slp/SlpDaemon.h"
 #include "agents/slp/SlpWire.h"
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 
@@ -145,7 +146,8 @@ public:
         if (!settings.interface.empty()) {
             in_addr address{};
             if (::inet_pton(AF_INET, settings.interface.c_str(), &address) != 1) {
-                Fail("Invalid SLP multicast interface address: " + settings.interface);
+                Fail("Invalid SLP multicast interface address: " +
+                     CmdKit::MessageExcerpt(settings.interface));
             }
             if (::setsockopt(socket.Fd(), IPPROTO_IP, IP_MULTICAST_IF, &address, sizeof address) !=
                 0) {
@@ -212,7 +214,8 @@ public:
         const int status =
             ::getaddrinfo(node.c_str(), std::to_string(port_).c_str(), &hints, &found);
         if (status != 0) {
-            Fail("Unable to resolve host '" + node + "': " + ::gai_strerror(status));
+            Fail("Unable to resolve host '" + CmdKit::MessageExcerpt(node) +
+                 "': " + ::gai_strerror(status));
         }
         std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> addresses(found, ::freeaddrinfo);
 
@@ -227,7 +230,8 @@ public:
                                           : AskOverUdp(*addresses, message, deadline);
         if (!Answers(reply, request.xid)) return;
         if (reply->errorCode != 0) {
-            Fail("SLP search of '" + node + "' failed: " + ErrorName(reply->errorCode));
+            Fail("SLP search of '" + CmdKit::MessageExcerpt(node) +
+                 "' failed: " + ErrorName(reply->errorCode));
         }
         std::set<std::string> seen;
         AddEntries(*reply, seen, services);
@@ -324,8 +328,8 @@ private:
             if (!SendAll(socket.Fd(), message, deadline)) return std::nullopt;
             return ReadReply(socket.Fd(), deadline);
         }
-        Fail("Unable to connect to '" + node + "' port " + std::to_string(port_) + ": " +
-             ErrnoText(lastError));
+        Fail("Unable to connect to '" + CmdKit::MessageExcerpt(node) + "' port " +
+             std::to_string(port_) + ": " + ErrnoText(lastError));
     }
 
     static bool Connect(int fd, const addrinfo& address, Clock::time_point deadline, int& error) {

@@ -8,6 +8,7 @@
 #include <sstream>
 
 #include "agents/snmp/Ber.h"
+#include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
 
 namespace BrixSim::Snmp {
@@ -109,11 +110,12 @@ bool ValidUserName(std::string_view name) {
 
 void CheckUserName(const std::string& entry, std::string_view name) {
     if (name.size() > kMaxUserName) {
-        Refuse("User name '" + std::string(name) + "' in '" + entry +
-               "' is longer than 32 characters.");
+        Refuse("User name '" + CmdKit::MessageExcerpt(std::string(name)) + "' in '" +
+               CmdKit::MessageExcerpt(entry) + "' is longer than 32 characters.");
     }
     if (!ValidUserName(name)) {
-        Refuse("User name '" + std::string(name) + "' in '" + entry +
+        Refuse("User name '" + CmdKit::MessageExcerpt(std::string(name)) + "' in '" +
+               CmdKit::MessageExcerpt(entry) +
                "' must be 1 to 32 printable characters without blanks.");
     }
 }
@@ -147,7 +149,8 @@ std::string Join(const std::vector<std::string>& parts, const char* separator) {
 }
 
 void CheckUnique(std::set<std::string>& seen, const std::string& name, const char* what) {
-    if (!seen.insert(name).second) Refuse(std::string(what) + " '" + name + "' is given twice.");
+    if (!seen.insert(name).second)
+        Refuse(std::string(what) + " '" + CmdKit::MessageExcerpt(name) + "' is given twice.");
 }
 
 }  // namespace
@@ -162,7 +165,8 @@ V1Target ParseV1Target(const std::string& entry) {
     const size_t slash = entry.find('/');
     const auto endpoint = ParseEndpoint(std::string_view(entry).substr(0, slash));
     if (slash == std::string::npos || !endpoint || slash + 1 == entry.size()) {
-        Refuse("Target '" + entry + "' is not of the form ip-or-hostname[@port]/community.");
+        Refuse("Target '" + CmdKit::MessageExcerpt(entry) +
+               "' is not of the form ip-or-hostname[@port]/community.");
     }
     return {*endpoint, entry.substr(slash + 1)};
 }
@@ -170,23 +174,26 @@ V1Target ParseV1Target(const std::string& entry) {
 LocalUser ParseLocalUser(const std::string& entry) {
     const auto fields = Split(entry, '/');
     if (fields.size() != 4) {
-        Refuse("User '" + entry + "' is not of the form user/-|auth-hash/-|priv-hash/model.");
+        Refuse("User '" + CmdKit::MessageExcerpt(entry) +
+               "' is not of the form user/-|auth-hash/-|priv-hash/model.");
     }
     CheckUserName(entry, fields[0]);
     if (!ValidHash(fields[1]) || !ValidHash(fields[2])) {
-        Refuse("User '" + fields[0] +
+        Refuse("User '" + CmdKit::MessageExcerpt(fields[0]) +
                "': a hash is '-' or 32 or 40 hexadecimal digits as 'system snmp hash' gives it.");
     }
     if (!OneOf(fields[3], {"none", "auth", "priv"})) {
-        Refuse("User '" + fields[0] + "': model '" + fields[3] +
-               "' is not one of none, auth, priv.");
+        Refuse("User '" + CmdKit::MessageExcerpt(fields[0]) + "': model '" +
+               CmdKit::MessageExcerpt(fields[3]) + "' is not one of none, auth, priv.");
     }
     LocalUser user{fields[0], HashOrEmpty(fields[1]), HashOrEmpty(fields[2]), fields[3]};
     if (user.model != "none" && user.authHash.empty()) {
-        Refuse("User '" + user.name + "': model " + user.model + " needs an authentication hash.");
+        Refuse("User '" + CmdKit::MessageExcerpt(user.name) + "': model " + user.model +
+               " needs an authentication hash.");
     }
     if (user.model == "priv" && user.privHash.empty()) {
-        Refuse("User '" + user.name + "': model priv needs a privacy hash.");
+        Refuse("User '" + CmdKit::MessageExcerpt(user.name) +
+               "': model priv needs a privacy hash.");
     }
     return user;
 }
@@ -194,7 +201,7 @@ LocalUser ParseLocalUser(const std::string& entry) {
 RemoteUser ParseRemoteUser(const std::string& entry) {
     const auto fields = Split(entry, '/');
     if (fields.size() != 6) {
-        Refuse("Remote user '" + entry +
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(entry) +
                "' is not of the form "
                "user/auth-proto/-|auth-hash/priv-proto/-|priv-hash/engine-id.");
     }
@@ -204,36 +211,40 @@ RemoteUser ParseRemoteUser(const std::string& entry) {
     user.authProtocol = fields[1];
     user.privProtocol = fields[3];
     if (!OneOf(user.authProtocol, {"none", "MD5", "SHA1"})) {
-        Refuse("Remote user '" + user.name + "': auth-proto '" + user.authProtocol +
-               "' is not one of none, MD5, SHA1.");
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) + "': auth-proto '" +
+               CmdKit::MessageExcerpt(user.authProtocol) + "' is not one of none, MD5, SHA1.");
     }
     if (!OneOf(user.privProtocol, {"none", "AES"})) {
-        Refuse("Remote user '" + user.name + "': priv-proto '" + user.privProtocol +
-               "' is not one of none, AES.");
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) + "': priv-proto '" +
+               CmdKit::MessageExcerpt(user.privProtocol) + "' is not one of none, AES.");
     }
     if (!ValidHash(fields[2]) || !ValidHash(fields[4])) {
-        Refuse("Remote user '" + user.name +
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) +
                "': a hash is '-' or 32 or 40 hexadecimal digits as 'system snmp hash' gives it.");
     }
     user.authHash = HashOrEmpty(fields[2]);
     user.privHash = HashOrEmpty(fields[4]);
     const auto engineId = EngineIdHex(fields[5]);
     if (!engineId) {
-        Refuse("Remote user '" + user.name + "': engine-id '" + fields[5] +
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) + "': engine-id '" +
+               CmdKit::MessageExcerpt(fields[5]) +
                "' must be 10 to 32 hexadecimal digits (an even number), optionally after 0x.");
     }
     user.engineId = *engineId;
     if (user.authProtocol == "none") {
         if (user.privProtocol != "none") {
-            Refuse("Remote user '" + user.name + "': privacy needs an authentication protocol.");
+            Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) +
+                   "': privacy needs an authentication protocol.");
         }
     } else if (user.authHash.empty() ||
                user.authHash.size() != 2 * (user.authProtocol == "MD5" ? 16 : 20)) {
-        Refuse("Remote user '" + user.name + "': auth-proto " + user.authProtocol + " needs a " +
-               (user.authProtocol == "MD5" ? "32" : "40") + "-digit authentication hash.");
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) + "': auth-proto " +
+               user.authProtocol + " needs a " + (user.authProtocol == "MD5" ? "32" : "40") +
+               "-digit authentication hash.");
     }
     if (user.privProtocol == "AES" && user.privHash.empty()) {
-        Refuse("Remote user '" + user.name + "': priv-proto AES needs a privacy hash.");
+        Refuse("Remote user '" + CmdKit::MessageExcerpt(user.name) +
+               "': priv-proto AES needs a privacy hash.");
     }
     return user;
 }
@@ -242,16 +253,17 @@ V3Target ParseV3Target(const std::string& entry) {
     const auto fields = Split(entry, '/');
     const auto endpoint = fields.size() == 4 ? ParseEndpoint(fields[0]) : std::nullopt;
     if (!endpoint || fields[1].empty()) {
-        Refuse("V3 target '" + entry +
+        Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) +
                "' is not of the form ip-or-hostname[@port]/remote-user/security-level/"
                "trap|inform.");
     }
     if (!OneOf(fields[2], {"none", "auth", "priv"})) {
-        Refuse("V3 target '" + entry + "': security level '" + fields[2] +
-               "' is not one of none, auth, priv.");
+        Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) + "': security level '" +
+               CmdKit::MessageExcerpt(fields[2]) + "' is not one of none, auth, priv.");
     }
     if (!OneOf(fields[3], {"trap", "inform"})) {
-        Refuse("V3 target '" + entry + "': '" + fields[3] + "' is neither trap nor inform.");
+        Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) + "': '" +
+               CmdKit::MessageExcerpt(fields[3]) + "' is neither trap nor inform.");
     }
     return {*endpoint, fields[1], fields[2], fields[3] == "inform"};
 }
@@ -261,9 +273,11 @@ std::vector<std::string> CheckCommunities(const std::vector<std::string>& entrie
     CheckCount(communities.size(), kMaxCommunities, "communities");
     for (const auto& community : communities) {
         if (community.size() > kMaxCommunityLength) {
-            Refuse("Community '" + community + "' is longer than 64 characters.");
+            Refuse("Community '" + CmdKit::MessageExcerpt(community) +
+                   "' is longer than 64 characters.");
         }
-        if (HasControl(community)) Refuse("Community '" + community + "' has control characters.");
+        if (HasControl(community))
+            Refuse("Community '" + CmdKit::MessageExcerpt(community) + "' has control characters.");
     }
     return communities;
 }
@@ -274,7 +288,8 @@ std::vector<std::string> CheckTargets(const std::vector<std::string>& entries) {
     for (const auto& target : targets) {
         const auto parsed = ParseV1Target(target);
         if (parsed.community.size() > kMaxCommunityLength) {
-            Refuse("Target '" + target + "': the community is longer than 64 characters.");
+            Refuse("Target '" + CmdKit::MessageExcerpt(target) +
+                   "': the community is longer than 64 characters.");
         }
     }
     return targets;
@@ -307,8 +322,8 @@ std::optional<std::string> CheckOption(const std::string& key, const std::string
     auto checkEnum = [&](const char* name, std::initializer_list<std::string_view> allowed) {
         if (!OneOf(value, allowed)) {
             std::vector<std::string> names(allowed.begin(), allowed.end());
-            Refuse("Invalid " + std::string(name) + " '" + value + "': use one of " +
-                   Join(names, ", ") + ".");
+            Refuse("Invalid " + std::string(name) + " '" + CmdKit::MessageExcerpt(value) +
+                   "': use one of " + Join(names, ", ") + ".");
         }
     };
     if (key == "EventFilter") {
@@ -322,7 +337,7 @@ std::optional<std::string> CheckOption(const std::string& key, const std::string
                 if (!digits) throw std::invalid_argument(oid);
                 Ber::Oid(oid);
             } catch (const std::invalid_argument&) {
-                Refuse("Invalid trap oid '" + oid +
+                Refuse("Invalid trap oid '" + CmdKit::MessageExcerpt(oid) +
                        "' in notraps: give dotted numbers such as 1.3.6.1.6.3.1.1.5.1.");
             }
         }
@@ -331,7 +346,7 @@ std::optional<std::string> CheckOption(const std::string& key, const std::string
     }
     if (key != "EnvEventSource" && key != "loglevel" && key != "authentication" &&
         key != "privacy" && key != "syslocation" && key != "syscontact" && key != "engineid") {
-        Refuse("Unknown option '" + key + "'.");
+        Refuse("Unknown option '" + CmdKit::MessageExcerpt(key) + "'.");
     }
     if (value.empty()) return std::nullopt;
     if (key == "EnvEventSource") checkEnum("hwsrc", {"indications", "sensors"});
@@ -345,7 +360,7 @@ std::optional<std::string> CheckOption(const std::string& key, const std::string
     if (key == "engineid") {
         const auto hex = EngineIdHex(value);
         if (!hex) {
-            Refuse("Engine id '" + value +
+            Refuse("Engine id '" + CmdKit::MessageExcerpt(value) +
                    "' must be 10 to 32 hexadecimal digits, an even number of them.");
         }
         return hex;
@@ -371,15 +386,18 @@ void CheckConsistency(const Settings& settings) {
         const auto target = ParseV3Target(entry);
         const auto user = remote.find(target.user);
         if (user == remote.end()) {
-            Refuse("V3 target '" + entry + "' names remote user '" + target.user +
+            Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) + "' names remote user '" +
+                   CmdKit::MessageExcerpt(target.user) +
                    "', which is not configured: add it with --remote-users.");
         }
         if (target.level != "none" && user->second.authProtocol == "none") {
-            Refuse("V3 target '" + entry + "' asks for " + target.level + ", but remote user '" +
-                   target.user + "' has no authentication protocol.");
+            Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) + "' asks for " + target.level +
+                   ", but remote user '" + CmdKit::MessageExcerpt(target.user) +
+                   "' has no authentication protocol.");
         }
         if (target.level == "priv" && user->second.privProtocol == "none") {
-            Refuse("V3 target '" + entry + "' asks for priv, but remote user '" + target.user +
+            Refuse("V3 target '" + CmdKit::MessageExcerpt(entry) +
+                   "' asks for priv, but remote user '" + CmdKit::MessageExcerpt(target.user) +
                    "' has no privacy protocol.");
         }
     }

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "cmdkit/Text.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
@@ -220,7 +221,7 @@ public:
             providerChanges_[name] = enabled;
             return;
         }
-        throw HostCtlException("Provider '" + name + "' is not installed");
+        throw HostCtlException("Provider '" + CmdKit::MessageExcerpt(name) + "' is not installed");
     }
 
     int GetPort() override {
@@ -245,7 +246,7 @@ public:
     void SetLogLevel(const std::string& level) override {
         Store::Get().Check(kSetLogLevel);
         if (kLogLevels.count(level) == 0)
-            throw HostCtlException("Invalid log level '" + level + "'");
+            throw HostCtlException("Invalid log level '" + CmdKit::MessageExcerpt(level) + "'");
         settings_.logLevel = level;
         changed_.insert(kLogLevel);
     }
