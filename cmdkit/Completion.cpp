@@ -20,7 +20,7 @@ struct GlobalOption {
     std::vector<std::string> values;
 };
 
-// The options RunCli takes anywhere on the line.
+// The options RunCli takes anywhere on the line; one without a list of values takes a file name.
 std::vector<GlobalOption> GlobalOptions() {
     return {
         {"--help", "Print the help of the path", false, {}},
@@ -29,6 +29,10 @@ std::vector<GlobalOption> GlobalOptions() {
         {"--formatter", "Output format", true, Detail::FormatterNames()},
         {"--completion", "Print a shell completion script", true, CompletionShells()},
         {"--reference", "Print the command reference in Markdown", false, {}},
+        {"--batch", "Run the command lines of a file, - for standard input", true, {}},
+        {"--stop-on-error", "With --batch: stop after the first failing line", false, {}},
+        {"--version", "Print the version", false, {}},
+        {"--verbose", "With --version: list the plug-ins loaded", false, {}},
     };
 }
 
@@ -237,6 +241,7 @@ _brixcli_values_of() {
     fi
     [[ -n ${_brixcli_global_values[$2]+set} ]] || return 1
     values=${_brixcli_global_values[$2]}
+    [[ -n $values ]] || return 2
 }
 
 _brixcli() {
@@ -345,6 +350,7 @@ _brixcli_values_of() {
     fi
     (( ${+_brixcli_global_values[$2]} )) || return 1
     values=${_brixcli_global_values[$2]}
+    [[ -n $values ]] || return 2
 }
 
 # Appends to `reply` each word of the list $1 as "word:summary", the summary found under the

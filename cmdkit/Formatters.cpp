@@ -578,4 +578,9 @@ void Format(const std::string& formatter, const MetaObj::MetaObject& result,
     }
 }
 
+nlohmann::ordered_json ResultJson(const MetaObj::MetaObject& result,
+                                  const MetaObj::MetaObject* prototype) {
+    return ToJson(&result, prototype);
+}
+
 }  // namespace CmdKit::Detail

@@ -4,6 +4,7 @@
 #include <iosfwd>
 #include <map>
 #include <memory>
+#include <nlohmann/json_fwd.hpp>
 #include <string>
 #include <vector>
 
@@ -45,5 +46,8 @@ const std::vector<std::string>& FormatterNames();
 // Writes `result` (non-null) with the named formatter.
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out);
+// `result` as the json formatter writes it, `prototype` giving the field order.
+nlohmann::ordered_json ResultJson(const MetaObj::MetaObject& result,
+                                  const MetaObj::MetaObject* prototype);
 
 }  // namespace CmdKit::Detail

@@ -111,8 +111,9 @@ std::vector<std::string> BashComplete(const fs::path& script,
     return Lines(run.out);
 }
 
-const std::vector<std::string> kGlobals = {"--help",      "-h",           "--list-commands",
-                                           "--formatter", "--completion", "--reference"};
+const std::vector<std::string> kGlobals = {
+    "--help",      "-h",      "--list-commands", "--formatter", "--completion",
+    "--reference", "--batch", "--stop-on-error", "--version",   "--verbose"};
 const std::vector<std::string> kCreateLong = {"--size",  "--mode", "--secure", "--force",
                                               "--label", "--tag",  "--when"};
 const std::vector<std::string> kBooleans = {"true", "false", "yes", "no", "1", "0"};
@@ -265,8 +266,13 @@ INSTANTIATE_TEST_SUITE_P(
                  {"--help:Print the help of the path", "-h:Print the help of the path",
                   "--list-commands:List every command below the path", "--formatter:Output format",
                   "--completion:Print a shell completion script",
-                  "--reference:Print the command reference in Markdown"})},
+                  "--reference:Print the command reference in Markdown",
+                  "--batch:Run the command lines of a file, - for standard input",
+                  "--stop-on-error:With --batch: stop after the first failing line",
+                  "--version:Print the version",
+                  "--verbose:With --version: list the plug-ins loaded"})},
         CompletionCase{"FreeTextIsFiles", Create({"--label", ""}), {"files"}},
+        CompletionCase{"BatchFileIsFiles", {"--batch", ""}, {"files"}},
         CompletionCase{"UnknownWordEndsCompletion", {"disk", "bogus", ""}, {""}}),
     [](const testing::TestParamInfo<CompletionCase>& info) { return info.param.name; });
 

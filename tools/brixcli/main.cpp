@@ -1,4 +1,4 @@
-// brixcli: loads every plug-in of its plug-in folder, then runs one invocation.
+// brixcli: loads every plug-in of its plug-in folder, then runs one invocation or a batch.
 #include <dlfcn.h>
 #include <unistd.h>
 
@@ -24,12 +24,14 @@ fs::path PluginFolder() {
     std::error_code error;
     fs::path exe = fs::read_symlink("/proc/self/exe", error);
     if (error) return fs::path("lib/brixcli/plugins");
-    return exe.parent_path() / ".." / "lib" / "brixcli" / "plugins";
+    return (exe.parent_path() / ".." / "lib" / "brixcli" / "plugins").lexically_normal();
 }
 
 // Loads each *.so of the folder in name order and lets it attach its branch to `root`. A
-// plug-in that cannot be loaded is reported and skipped; the others still serve.
-void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
+// plug-in that cannot be loaded is reported and skipped; the others still serve. Returns the
+// paths of those loaded.
+std::vector<std::string> LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
+    std::vector<std::string> loaded;
     const fs::path folder = PluginFolder();
     std::error_code error;
     std::vector<fs::path> libraries;
@@ -54,11 +56,13 @@ void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
         }
         try {
             entry(root);
+            loaded.push_back(library.string());
         } catch (const std::exception& failure) {
             std::cerr << "brixcli: plug-in " << library.string()
                       << " failed to register: " << failure.what() << '\n';
         }
     }
+    return loaded;
 }
 
 }  // namespace
@@ -69,9 +73,9 @@ int main(int argc, char** argv) {
     // long listings write much faster through.
     std::ios::sync_with_stdio(false);
     auto root = CmdKit::AutoCli::Namespace::New();
-    LoadPlugins(root);
+    CmdKit::AutoCli::Program program{"brixcli", BRIX_VERSION, LoadPlugins(root)};
     std::vector<std::string> args(argv + 1, argv + argc);
-    int status = CmdKit::AutoCli::RunCli(root, args, std::cout, std::cerr);
+    int status = CmdKit::AutoCli::RunCli(root, args, std::cout, std::cerr, program);
     std::cout.flush();
     std::cerr.flush();
     return status;
