@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <boost/algorithm/string/join.hpp>
 #include <cstdlib>
 #include <iostream>
 #include <optional>
@@ -30,8 +31,6 @@ ExecutionScope CurrentExecutionScope() {
     return executionScope.load();
 }
 
-constexpr const char* kFormatters = "simple, table, json, xml, csv, keyvalue";
-
 // The options a command line may give anywhere.
 struct Globals {
     std::string formatter;
@@ -45,15 +44,15 @@ struct Globals {
     bool stopOnError = false;
 };
 
-std::string ShellList() {
-    std::string text;
-    for (const auto& shell : CompletionShells()) text += (text.empty() ? "" : ", ") + shell;
-    return text;
+// " (one of: a, b)" for the messages about a value.
+std::string OneOf(const std::vector<std::string>& names) {
+    return " (one of: " + boost::algorithm::join(names, ", ") + ")";
 }
 
 // When args[i] is `name=VALUE` or `name` (its value then the next word, skipped), sets `value`.
+// A missing value is refused, naming `choices` when there are any.
 bool TakeValue(const std::vector<std::string>& args, size_t& i, const std::string& name,
-               const std::string& choices, std::string& value) {
+               const std::vector<std::string>& choices, std::string& value) {
     const std::string& word = args[i];
     if (word.compare(0, name.size(), name) != 0) return false;
     if (word.size() > name.size()) {
@@ -62,7 +61,8 @@ bool TakeValue(const std::vector<std::string>& args, size_t& i, const std::strin
     } else if (i + 1 < args.size()) {
         value = args[++i];
     } else {
-        throw UsageError("Error: Missing value for " + name + choices);
+        throw UsageError("Error: Missing value for " + name +
+                         (choices.empty() ? "" : OneOf(choices)));
     }
     return true;
 }
@@ -82,23 +82,22 @@ bool TakeGlobal(const std::vector<std::string>& args, size_t& i, Globals& global
         return true;
     }
     std::string value;
-    if (TakeValue(args, i, "--completion", " (one of: " + ShellList() + ")", value)) {
+    if (TakeValue(args, i, "--completion", CompletionShells(), value)) {
         const auto& shells = CompletionShells();
         if (std::find(shells.begin(), shells.end(), value) == shells.end()) {
-            throw UsageError("Error: Unknown shell " + value + " (one of: " + ShellList() + ")");
+            throw UsageError("Error: Unknown shell " + value + OneOf(shells));
         }
         globals.completionShell = value;
         return true;
     }
-    if (TakeValue(args, i, "--formatter", " (one of: " + std::string(kFormatters) + ")", value)) {
+    if (TakeValue(args, i, "--formatter", Detail::FormatterNames(), value)) {
         if (!Detail::IsFormatterName(value)) {
-            throw UsageError("Error: Unknown formatter " + value + " (one of: " + kFormatters +
-                             ")");
+            throw UsageError("Error: Unknown formatter " + value + OneOf(Detail::FormatterNames()));
         }
         globals.formatter = value;
         return true;
     }
-    if (TakeValue(args, i, "--batch", "", value)) {
+    if (TakeValue(args, i, "--batch", {}, value)) {
         globals.batch = value;
         return true;
     }
@@ -271,7 +270,7 @@ Outcome Dispatch(const Program& program, NamespaceNode& root, const Request& req
     NamespaceNode& node = *request.node;
     std::ostringstream text;
     if (globals.help) {
-        Detail::PrintHelp(node, text);
+        Detail::PrintHelp(node, program.name, text);
         return Text(text.str());
     }
     if (globals.stopOnError) throw UsageError("Error: --stop-on-error needs --batch");
@@ -279,11 +278,11 @@ Outcome Dispatch(const Program& program, NamespaceNode& root, const Request& req
     if (globals.version) return Text(VersionText(program, globals.verbose));
     // Generated from the whole tree whatever the path: the script completes every path.
     if (!globals.completionShell.empty()) {
-        WriteCompletionScript(root, globals.completionShell, text);
+        WriteCompletionScript(root, globals.completionShell, text, program);
         return Text(text.str());
     }
     if (globals.reference) {
-        WriteReference(node, text);
+        WriteReference(node, text, program);
         return Text(text.str());
     }
     if (globals.listCommands) return ListCommands(node, globals.formatter);
@@ -295,7 +294,7 @@ Outcome Dispatch(const Program& program, NamespaceNode& root, const Request& req
             }
         }
         std::string path = node.GetPathString(' ');
-        Detail::PrintHelp(node, text);
+        Detail::PrintHelp(node, program.name, text);
         std::string help = text.str();
         if (!help.empty() && help.back() == '\n') help.pop_back();
         return Failure(

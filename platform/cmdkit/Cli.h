@@ -37,12 +37,14 @@ int RunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::st
 const std::vector<std::string>& CompletionShells();
 
 // Writes a self-contained completion script for `shell` (one of CompletionShells()) that
-// completes the paths, options and option values of the tree under `root` as it is now.
-void WriteCompletionScript(NamespaceNode& root, const std::string& shell, std::ostream& out);
+// completes the paths, options and option values of the tree under `root` as it is now, for the
+// program's name (letters, digits and '_' only: it also names the script's functions).
+void WriteCompletionScript(NamespaceNode& root, const std::string& shell, std::ostream& out,
+                           const Program& program = {});
 
 // Writes the Markdown reference of every path under `node`, in tree order: descriptions,
 // parameters and result fields.
-void WriteReference(NamespaceNode& node, std::ostream& out);
+void WriteReference(NamespaceNode& node, std::ostream& out, const Program& program = {});
 
 // RunCli up to, but not including, the command's execution: global options, path resolution,
 // help, the command list and the parsing of the command's arguments, with RunCli's output and

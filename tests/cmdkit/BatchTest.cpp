@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <fstream>
 #include <nlohmann/json.hpp>
-#include <regex>
 
 #include "FakeCommand.h"
 #include "brixcli/SystemPlugin.h"
@@ -51,6 +50,10 @@ struct QuotingCase {
     std::string out;
     std::string err;
 };
+
+void PrintTo(const QuotingCase& row, std::ostream* out) {
+    *out << row.line;
+}
 
 class BatchQuoting : public testing::TestWithParam<QuotingCase> {};
 
@@ -209,18 +212,17 @@ TEST(BatchOnHost, ALineSeesAnotherProcessesChange) {
 
 TEST(Version, BothToolsAnswer) {
     BrixTest::TempHost host;
-    const std::regex version(R"([0-9]+\.[0-9]+\.[0-9]+\n)");
     auto cli = host.Cli({"--version"});
     EXPECT_EQ(cli.status, 0);
-    EXPECT_TRUE(std::regex_match(cli.out, std::regex("brixcli " + std::string(R"([0-9.]+\n)"))))
-        << cli.out;
+    EXPECT_EQ(cli.out, "brixcli " BRIX_VERSION "\n");
     auto verbose = host.Cli({"--version", "--verbose"});
     EXPECT_EQ(verbose.status, 0);
-    EXPECT_EQ(verbose.out.rfind(cli.out + "Plug-ins:\n  /", 0), 0u) << verbose.out;
-    EXPECT_NE(verbose.out.find("/libbrixcli-system.so\n"), std::string::npos) << verbose.out;
+    EXPECT_EQ(verbose.out, "brixcli " BRIX_VERSION "\nPlug-ins:\n  " +
+                               fs::canonical(BRIX_BIN_DIR "/../lib/brixcli/plugins").string() +
+                               "/libbrixcli-system.so\n");
     auto sim = host.Sim({"--version"});
     EXPECT_EQ(sim.status, 0);
-    EXPECT_EQ(sim.out, "brixsim " + cli.out.substr(8));
+    EXPECT_EQ(sim.out, "brixsim " BRIX_VERSION "\n");
 }
 
 }  // namespace

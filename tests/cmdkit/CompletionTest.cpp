@@ -111,9 +111,11 @@ std::vector<std::string> BashComplete(const fs::path& script,
     return Lines(run.out);
 }
 
-const std::vector<std::string> kGlobals = {
-    "--help",      "-h",      "--list-commands", "--formatter", "--completion",
-    "--reference", "--batch", "--stop-on-error", "--version",   "--verbose"};
+const std::vector<std::string> kGlobals = {"--help",      "-h",           "--list-commands",
+                                           "--formatter", "--completion", "--reference",
+                                           "--version",   "--verbose"};
+// Offered only before a path.
+const std::vector<std::string> kRootGlobals = {"--batch", "--stop-on-error"};
 const std::vector<std::string> kCreateLong = {"--size",  "--mode", "--secure", "--force",
                                               "--label", "--tag",  "--when"};
 const std::vector<std::string> kBooleans = {"true", "false", "yes", "no", "1", "0"};
@@ -156,7 +158,8 @@ INSTANTIATE_TEST_SUITE_P(
         CompletionCase{"NestedPath", {"disk", ""}, {"volume", "list"}},
         CompletionCase{"DeepPath", {"disk", "volume", "s"}, {"show"}},
         CompletionCase{"UnknownWordEndsCompletion", {"disk", "bogus", ""}, {}},
-        CompletionCase{"GlobalOptionsAtRoot", {"-"}, kGlobals},
+        CompletionCase{"GlobalOptionsAtRoot", {"-"}, Join(kGlobals, kRootGlobals)},
+        CompletionCase{"BatchOnlyAtRoot", {"disk", "--b"}, {}},
         CompletionCase{"GlobalBeforePath", {"--formatter", "json", "d"}, {"disk", "dns"}},
         CompletionCase{"FormatterValues",
                        {"--formatter", ""},
@@ -165,9 +168,10 @@ INSTANTIATE_TEST_SUITE_P(
         CompletionCase{"CompletionShells", {"--completion", ""}, {"bash", "zsh"}},
         CompletionCase{"OptionsLongThenShort", Create({""}),
                        Join(kCreateLong, {"-s", "-e", "-f", "-l"})},
-        CompletionCase{"OptionsAndGlobalsAfterDashes", Create({"--"}),
-                       Join(kCreateLong, {"--help", "--list-commands", "--formatter",
-                                          "--completion", "--reference"})},
+        CompletionCase{
+            "OptionsAndGlobalsAfterDashes", Create({"--"}),
+            Join(kCreateLong, {"--help", "--list-commands", "--formatter", "--completion",
+                               "--reference", "--version", "--verbose"})},
         CompletionCase{"OptionPrefix", Create({"--s"}), {"--size", "--secure"}},
         CompletionCase{"NoPathAfterCommand", Create({"sh"}), {}},
         CompletionCase{"NothingAfterCommandWithoutOptions", {"disk", "volume", "show", ""}, {}},
@@ -267,8 +271,6 @@ INSTANTIATE_TEST_SUITE_P(
                   "--list-commands:List every command below the path", "--formatter:Output format",
                   "--completion:Print a shell completion script",
                   "--reference:Print the command reference in Markdown",
-                  "--batch:Run the command lines of a file, - for standard input",
-                  "--stop-on-error:With --batch: stop after the first failing line",
                   "--version:Print the version",
                   "--verbose:With --version: list the plug-ins loaded"})},
         CompletionCase{"FreeTextIsFiles", Create({"--label", ""}), {"files"}},
