@@ -101,7 +101,7 @@ int RunBatch(const AutoCli::Program& program, const std::shared_ptr<AutoCli::Nam
 
         Outcome outcome;
         try {
-            outcome = RunLine(program, root, SplitWords(line), batch.formatter, batch.execute);
+            outcome = RunLine(program, root, SplitWords(line), batch.formatter);
         } catch (const UsageError& error) {
             outcome.status = 2;
             outcome.messages = {error.what()};

@@ -350,10 +350,11 @@ int Run(const Program& program, const std::shared_ptr<NamespaceNode>& root,
             globals.verbose || !globals.completionShell.empty()) {
             throw UsageError("Error: --batch takes only --formatter and --stop-on-error");
         }
-        batch = Detail::Batch{*globals.batch, globals.formatter, globals.stopOnError, execute};
+        batch = Detail::Batch{*globals.batch, globals.formatter, globals.stopOnError};
         return Outcome{};
     });
-    if (batch) return Detail::RunBatch(program, root, *batch, out, err);
+    // A dry run stops before the commands, so before reading the batch's file.
+    if (batch) return execute ? Detail::RunBatch(program, root, *batch, out, err) : 0;
     Detail::Print(outcome, out, err);
     return outcome.status;
 }
@@ -380,12 +381,12 @@ namespace CmdKit::Detail {
 
 Outcome RunLine(const AutoCli::Program& program,
                 const std::shared_ptr<AutoCli::NamespaceNode>& root,
-                const std::vector<std::string>& words, const std::string& formatter, bool execute) {
+                const std::vector<std::string>& words, const std::string& formatter) {
     return AutoCli::Guarded([&] {
         AutoCli::Request request = AutoCli::ReadRequest(root, words);
         if (request.globals.batch) throw UsageError("Error: --batch cannot be used in a batch");
         if (request.globals.formatter.empty()) request.globals.formatter = formatter;
-        return AutoCli::Dispatch(program, *root, request, execute);
+        return AutoCli::Dispatch(program, *root, request, true);
     });
 }
 

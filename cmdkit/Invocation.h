@@ -27,7 +27,7 @@ struct Outcome {
 // formatter `formatter` unless the line gives its own.
 Outcome RunLine(const AutoCli::Program& program,
                 const std::shared_ptr<AutoCli::NamespaceNode>& root,
-                const std::vector<std::string>& words, const std::string& formatter, bool execute);
+                const std::vector<std::string>& words, const std::string& formatter);
 
 // Writes the messages to `err`, each of their lines after `prefix`, then the result or the text
 // to `out`, and flushes `out`.
@@ -38,7 +38,6 @@ struct Batch {
     std::string file;  // "-": standard input
     std::string formatter;
     bool stopOnError = false;
-    bool execute = true;
 };
 
 // Runs every command line of the batch's file and returns the worst status.

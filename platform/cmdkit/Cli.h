@@ -48,8 +48,8 @@ void WriteReference(NamespaceNode& node, std::ostream& out, const Program& progr
 
 // RunCli up to, but not including, the command's execution: global options, path resolution,
 // help, the command list and the parsing of the command's arguments, with RunCli's output and
-// status. An invocation that would run a command returns 0 and prints nothing; nothing on the
-// host is read or changed.
+// status. An invocation that would run a command, or a batch (whose file is not read), returns
+// 0 and prints nothing; nothing on the host is read or changed.
 int DryRunCli(const std::shared_ptr<NamespaceNode>& root, const std::vector<std::string>& args,
               std::ostream& out, std::ostream& err, const Program& program = {});
 
