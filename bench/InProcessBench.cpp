@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <fstream>
 #include <map>
 #include <sstream>
 
@@ -109,6 +110,27 @@ void ExecuteGetterLargeHost(benchmark::State& state) {
     }
 }
 BENCHMARK(ExecuteGetterLargeHost);
+
+// A batch of 2,000 getters (four kinds in turn) read from a file, per line: what a line costs
+// once the process has started.
+void BatchOfGetters(benchmark::State& state) {
+    Hosts().Use("default", {});
+    auto root = Tree();
+    const auto file = Hosts().top / "getters.batch";
+    {
+        std::ofstream lines(file);
+        const char* getters[] = {"system uuid get", "system hostname get", "system time get",
+                                 "system stats uptime get"};
+        for (int i = 0; i < 2000; ++i) lines << getters[i % 4] << '\n';
+    }
+    std::ostringstream out, err;
+    for (auto _ : state) {
+        out.str("");
+        AutoCli::RunCli(root, {"--batch", file.string()}, out, err);
+    }
+    state.SetItemsProcessed(state.iterations() * 2000);
+}
+BENCHMARK(BatchOfGetters)->Unit(benchmark::kMillisecond);
 
 // Whole listings against the store: reading, building the rows and formatting them as a table.
 void ExecuteListing(benchmark::State& state, const char* key, const char* command) {

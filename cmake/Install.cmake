@@ -30,4 +30,9 @@ configure_package_config_file(${CMAKE_CURRENT_LIST_DIR}/brixcliConfig.cmake.in
                               ${CMAKE_BINARY_DIR}/cmake/brixcliConfig.cmake
                               INSTALL_DESTINATION ${BRIXCLI_INSTALL_CMAKEDIR}
                               PATH_VARS BRIXCLI_INSTALL_PLUGINDIR)
-install(FILES ${CMAKE_BINARY_DIR}/cmake/brixcliConfig.cmake DESTINATION ${BRIXCLI_INSTALL_CMAKEDIR})
+# find_package(brixcli 1.0 CONFIG) accepts this release and later ones of the same major version.
+write_basic_package_version_file(${CMAKE_BINARY_DIR}/cmake/brixcliConfigVersion.cmake
+                                 VERSION ${PROJECT_VERSION} COMPATIBILITY SameMajorVersion)
+install(FILES ${CMAKE_BINARY_DIR}/cmake/brixcliConfig.cmake
+              ${CMAKE_BINARY_DIR}/cmake/brixcliConfigVersion.cmake
+        DESTINATION ${BRIXCLI_INSTALL_CMAKEDIR})

@@ -1,6 +1,8 @@
 // Shell completion scripts generated from the command tree. The tree's words, options and
 // option values are written into the script as tables, so completing a word never runs brixcli.
 #include <algorithm>
+#include <boost/algorithm/string/replace.hpp>
+#include <cctype>
 #include <cstdio>
 #include <ostream>
 
@@ -11,16 +13,15 @@ namespace CmdKit::AutoCli {
 
 namespace {
 
-constexpr const char* kProgram = "brixcli";
-
 struct GlobalOption {
     std::string word;
     std::string description;
     bool takesValue = false;
     std::vector<std::string> values;
+    bool beforePathOnly = false;
 };
 
-// The options RunCli takes anywhere on the line.
+// The options RunCli takes on the line; one without a list of values takes a file name.
 std::vector<GlobalOption> GlobalOptions() {
     return {
         {"--help", "Print the help of the path", false, {}},
@@ -29,6 +30,10 @@ std::vector<GlobalOption> GlobalOptions() {
         {"--formatter", "Output format", true, Detail::FormatterNames()},
         {"--completion", "Print a shell completion script", true, CompletionShells()},
         {"--reference", "Print the command reference in Markdown", false, {}},
+        {"--batch", "Run the command lines of a file, - for standard input", true, {}, true},
+        {"--stop-on-error", "With --batch: stop after the first failing line", false, {}, true},
+        {"--version", "Print the version", false, {}},
+        {"--verbose", "With --version: list the plug-ins loaded", false, {}},
     };
 }
 
@@ -44,7 +49,8 @@ struct Tables {
     Table freeText;      // option key of an unconstrained string option -> "1"
     Table values;        // option key -> the values it accepts, when they are a fixed list
     Table descriptions;  // node key, option key or "<option key>=<value>" -> one-line summary
-    std::string globals;
+    std::string globals;      // the global options taken anywhere
+    std::string rootGlobals;  // those taken only before a path
     Table globalValues;  // global option word -> its values
 };
 
@@ -126,16 +132,17 @@ void AddNode(NamespaceNode& node, const std::string& key, Tables& tables) {
     }
 }
 
-Tables Flatten(NamespaceNode& root) {
+Tables Flatten(NamespaceNode& root, const std::string& program) {
     Tables tables;
-    AddNode(root, kProgram, tables);
-    std::vector<std::string> globals;
+    AddNode(root, program, tables);
+    std::vector<std::string> globals, rootGlobals;
     for (const auto& option : GlobalOptions()) {
-        globals.push_back(option.word);
+        (option.beforePathOnly ? rootGlobals : globals).push_back(option.word);
         tables.descriptions.emplace_back(option.word, option.description);
         if (option.takesValue) tables.globalValues.emplace_back(option.word, Lines(option.values));
     }
     tables.globals = Lines(globals);
+    tables.rootGlobals = Lines(rootGlobals);
     return tables;
 }
 
@@ -184,14 +191,22 @@ void WriteZshTable(std::ostream& out, const std::string& name, const Table& tabl
 }
 
 template <class WriteTable>
-void WriteTables(std::ostream& out, const Tables& tables, WriteTable writeTable) {
-    writeTable(out, "_brixcli_children", tables.children);
-    writeTable(out, "_brixcli_options", tables.options);
-    writeTable(out, "_brixcli_flags", tables.flags);
-    writeTable(out, "_brixcli_free_text", tables.freeText);
-    writeTable(out, "_brixcli_values", tables.values);
-    writeTable(out, "_brixcli_descriptions", tables.descriptions);
-    writeTable(out, "_brixcli_global_values", tables.globalValues);
+void WriteTables(std::ostream& out, const std::string& program, const Tables& tables,
+                 WriteTable writeTable) {
+    const std::string prefix = "_" + program + "_";
+    writeTable(out, prefix + "children", tables.children);
+    writeTable(out, prefix + "options", tables.options);
+    writeTable(out, prefix + "flags", tables.flags);
+    writeTable(out, prefix + "free_text", tables.freeText);
+    writeTable(out, prefix + "values", tables.values);
+    writeTable(out, prefix + "descriptions", tables.descriptions);
+    writeTable(out, prefix + "global_values", tables.globalValues);
+}
+
+// The shell functions below are written for a program named brixcli: each "brixcli" in them
+// (the command completed, its functions, tables and keys) stands for the program's name.
+std::string ForProgram(const char* functions, const std::string& program) {
+    return boost::algorithm::replace_all_copy(std::string(functions), "brixcli", program);
 }
 
 // Completion for bash (4.2 or later). The words before the cursor are walked from the root:
@@ -237,6 +252,7 @@ _brixcli_values_of() {
     fi
     [[ -n ${_brixcli_global_values[$2]+set} ]] || return 1
     values=${_brixcli_global_values[$2]}
+    [[ -n $values ]] || return 2
 }
 
 _brixcli() {
@@ -299,6 +315,7 @@ _brixcli() {
         fi
     elif [[ $cur == -* ]]; then
         _brixcli_add "$cur" "$_brixcli_globals" ""
+        [[ $key == brixcli ]] && _brixcli_add "$cur" "$_brixcli_root_globals" ""
     else
         _brixcli_add "$cur" "${_brixcli_children[$key]-}" ""
     fi
@@ -345,6 +362,7 @@ _brixcli_values_of() {
     fi
     (( ${+_brixcli_global_values[$2]} )) || return 1
     values=${_brixcli_global_values[$2]}
+    [[ -n $values ]] || return 2
 }
 
 # Appends to `reply` each word of the list $1 as "word:summary", the summary found under the
@@ -405,6 +423,7 @@ _brixcli_candidates() {
     elif [[ $cur == -* ]]; then
         REPLY=options
         _brixcli_describe "$_brixcli_globals" ""
+        [[ $key == brixcli ]] && _brixcli_describe "$_brixcli_root_globals" ""
     else
         REPLY=commands
         _brixcli_describe "${_brixcli_children[$key]-}" "$key "
@@ -438,20 +457,29 @@ const std::vector<std::string>& CompletionShells() {
     return shells;
 }
 
-void WriteCompletionScript(NamespaceNode& root, const std::string& shell, std::ostream& out) {
-    const Tables tables = Flatten(root);
+void WriteCompletionScript(NamespaceNode& root, const std::string& shell, std::ostream& out,
+                           const Program& program) {
+    const std::string& name = program.name;
+    if (name.empty() || !std::all_of(name.begin(), name.end(),
+                                     [](unsigned char c) { return std::isalnum(c) || c == '_'; })) {
+        throw CmdKitException("No completion for the program name " + name +
+                              ": letters, digits and _ only");
+    }
+    const Tables tables = Flatten(root, name);
     if (shell == "bash") {
-        out << "# bash completion for " << kProgram << ", generated by `" << kProgram
+        out << "# bash completion for " << name << ", generated by `" << name
             << " --completion bash`.\n";
-        WriteTables(out, tables, WriteBashTable);
-        out << "declare -g _brixcli_globals=" << Quote(tables.globals) << '\n';
-        out << kBashFunctions;
+        WriteTables(out, name, tables, WriteBashTable);
+        out << "declare -g _" << name << "_globals=" << Quote(tables.globals) << '\n';
+        out << "declare -g _" << name << "_root_globals=" << Quote(tables.rootGlobals) << '\n';
+        out << ForProgram(kBashFunctions, name);
     } else if (shell == "zsh") {
-        out << "#compdef " << kProgram << "\n# zsh completion for " << kProgram
-            << ", generated by `" << kProgram << " --completion zsh`.\n";
-        WriteTables(out, tables, WriteZshTable);
-        out << "typeset -g _brixcli_globals=" << Quote(tables.globals) << '\n';
-        out << kZshFunctions;
+        out << "#compdef " << name << "\n# zsh completion for " << name << ", generated by `"
+            << name << " --completion zsh`.\n";
+        WriteTables(out, name, tables, WriteZshTable);
+        out << "typeset -g _" << name << "_globals=" << Quote(tables.globals) << '\n';
+        out << "typeset -g _" << name << "_root_globals=" << Quote(tables.rootGlobals) << '\n';
+        out << ForProgram(kZshFunctions, name);
     } else {
         throw CmdKitException("No completion for the shell " + shell);
     }

@@ -572,40 +572,73 @@ void FormatKeyValue(const MetaObject& result, const FormatContext& context, std:
     }
 }
 
+void FormatJson(const MetaObject& result, const FormatContext& context, std::ostream& out) {
+    out << ToJson(&result, context.prototype.get())
+               .dump(2, ' ', false, nlohmann::json::error_handler_t::replace)
+        << '\n';
+}
+
+void FormatXml(const MetaObject& result, const FormatContext& context, std::ostream& out) {
+    pugi::xml_document document;
+    ToXml(&result, context.prototype.get(), document.append_child("output"));
+    XmlWriter writer(out);
+    document.save(writer, "  ", pugi::format_default, pugi::encoding_utf8);
+}
+
+// A table needs a list of structures; any other result is printed as simple prints it.
+void FormatTableOrSimple(const MetaObject& result, const FormatContext& context,
+                         std::ostream& out) {
+    const MetaList* list = AsList(&result);
+    if (list && list->GetElementType() == MetaObj::META_STRUCT) {
+        FormatTable(*list, context, out);
+    } else {
+        FormatSimple(result, context, out);
+    }
+}
+
+struct Formatter {
+    const char* name;
+    void (*write)(const MetaObject& result, const FormatContext& context, std::ostream& out);
+};
+
+// Every formatter, in the order the messages, the help and completion list them.
+constexpr Formatter kFormatters[] = {
+    {"simple", FormatSimple}, {"table", FormatTableOrSimple},
+    {"json", FormatJson},     {"xml", FormatXml},
+    {"csv", FormatCsv},       {"keyvalue", FormatKeyValue},
+};
+
+const Formatter* FindFormatter(const std::string& name) {
+    for (const auto& formatter : kFormatters) {
+        if (name == formatter.name) return &formatter;
+    }
+    return nullptr;
+}
+
 }  // namespace
 
 bool IsFormatterName(const std::string& name) {
-    return name == "simple" || name == "table" || name == "json" || name == "xml" ||
-           name == "csv" || name == "keyvalue";
+    return FindFormatter(name) != nullptr;
 }
 
 const std::vector<std::string>& FormatterNames() {
-    static const std::vector<std::string> names = {"simple", "table", "json",
-                                                   "xml",    "csv",   "keyvalue"};
+    static const std::vector<std::string> names = [] {
+        std::vector<std::string> all;
+        for (const auto& formatter : kFormatters) all.emplace_back(formatter.name);
+        return all;
+    }();
     return names;
 }
 
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out) {
-    if (formatter == "json") {
-        out << ToJson(&result, context.prototype.get())
-                   .dump(2, ' ', false, nlohmann::json::error_handler_t::replace)
-            << '\n';
-    } else if (formatter == "xml") {
-        pugi::xml_document document;
-        ToXml(&result, context.prototype.get(), document.append_child("output"));
-        XmlWriter writer(out);
-        document.save(writer, "  ", pugi::format_default, pugi::encoding_utf8);
-    } else if (formatter == "csv") {
-        FormatCsv(result, context, out);
-    } else if (formatter == "keyvalue") {
-        FormatKeyValue(result, context, out);
-    } else if (formatter == "table" && AsList(&result) &&
-               AsList(&result)->GetElementType() == MetaObj::META_STRUCT) {
-        FormatTable(*AsList(&result), context, out);
-    } else {
-        FormatSimple(result, context, out);
-    }
+    const Formatter* found = FindFormatter(formatter);
+    (found ? found->write : FormatSimple)(result, context, out);
+}
+
+nlohmann::ordered_json ResultJson(const MetaObj::MetaObject& result,
+                                  const MetaObj::MetaObject* prototype) {
+    return ToJson(&result, prototype);
 }
 
 }  // namespace CmdKit::Detail

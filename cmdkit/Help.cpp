@@ -1,5 +1,6 @@
 // Help of namespaces and commands.
 #include <algorithm>
+#include <boost/algorithm/string/join.hpp>
 #include <ostream>
 
 #include "Internal.h"
@@ -65,9 +66,10 @@ void PrintIndented(std::ostream& out, const std::string& text, size_t indent) {
     }
 }
 
-std::string Usage(const NamespaceNode& node) {
+std::string Usage(const NamespaceNode& node, const std::string& program) {
     std::string path = node.GetPathString(' ');
-    std::string usage = "Usage: brixcli [--formatter=simple|table|json|xml|csv|keyvalue]";
+    std::string usage = "Usage: " + program +
+                        " [--formatter=" + boost::algorithm::join(FormatterNames(), "|") + "]";
     if (!path.empty()) usage += " " + path;
     if (node.GetType() == NodeType::Command) return usage + " [cmd options]";
     return usage + " {cmd} [cmd options]";
@@ -152,8 +154,8 @@ void PrintColumns(std::ostream& out, const std::vector<std::pair<std::string, st
 
 }  // namespace
 
-void PrintHelp(NamespaceNode& node, std::ostream& out) {
-    out << Usage(node) << '\n';
+void PrintHelp(NamespaceNode& node, const std::string& program, std::ostream& out) {
+    out << Usage(node, program) << '\n';
     if (!node.GetDescription().empty()) {
         out << "\nDescription:\n";
         std::string text = node.GetDescription();

@@ -4,6 +4,7 @@
 #include <iosfwd>
 #include <map>
 #include <memory>
+#include <nlohmann/json_fwd.hpp>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -27,8 +28,8 @@ inline bool TakesValue(const CallSpec::ParameterSpec& parameter) {
 std::string ExpandEnumPlaceholders(const CallSpec::ParameterSpec& parameter,
                                    const std::string& description, const std::string& lineBreak);
 
-// The help of a namespace or command.
-void PrintHelp(AutoCli::NamespaceNode& node, std::ostream& out);
+// The help of a namespace or command, its usage line naming `program`.
+void PrintHelp(AutoCli::NamespaceNode& node, const std::string& program, std::ostream& out);
 
 using Hints = std::map<std::string, std::string>;
 
@@ -41,11 +42,14 @@ struct FormatContext {
 };
 
 bool IsFormatterName(const std::string& name);
-// Every formatter name, in the order the messages list them.
+// Every formatter name, in the order the messages, the help and completion list them.
 const std::vector<std::string>& FormatterNames();
-// Writes `result` (non-null) with the named formatter.
+// Writes `result` (non-null) with the named formatter (simple for an unknown name).
 void Format(const std::string& formatter, const MetaObj::MetaObject& result,
             const FormatContext& context, std::ostream& out);
+// `result` as the json formatter writes it, `prototype` giving the field order.
+nlohmann::ordered_json ResultJson(const MetaObj::MetaObject& result,
+                                  const MetaObj::MetaObject* prototype);
 
 // `text` as valid UTF-8 without control characters: each ill-formed UTF-8 sequence, each
 // control character (C0, DEL, C1) not in `kept` and the noncharacters U+FFFE and U+FFFF become

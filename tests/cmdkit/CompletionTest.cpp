@@ -112,7 +112,10 @@ std::vector<std::string> BashComplete(const fs::path& script,
 }
 
 const std::vector<std::string> kGlobals = {"--help",      "-h",           "--list-commands",
-                                           "--formatter", "--completion", "--reference"};
+                                           "--formatter", "--completion", "--reference",
+                                           "--version",   "--verbose"};
+// Offered only before a path.
+const std::vector<std::string> kRootGlobals = {"--batch", "--stop-on-error"};
 const std::vector<std::string> kCreateLong = {"--size",  "--mode", "--secure", "--force",
                                               "--label", "--tag",  "--when"};
 const std::vector<std::string> kBooleans = {"true", "false", "yes", "no", "1", "0"};
@@ -155,7 +158,8 @@ INSTANTIATE_TEST_SUITE_P(
         CompletionCase{"NestedPath", {"disk", ""}, {"volume", "list"}},
         CompletionCase{"DeepPath", {"disk", "volume", "s"}, {"show"}},
         CompletionCase{"UnknownWordEndsCompletion", {"disk", "bogus", ""}, {}},
-        CompletionCase{"GlobalOptionsAtRoot", {"-"}, kGlobals},
+        CompletionCase{"GlobalOptionsAtRoot", {"-"}, Join(kGlobals, kRootGlobals)},
+        CompletionCase{"BatchOnlyAtRoot", {"disk", "--b"}, {}},
         CompletionCase{"GlobalBeforePath", {"--formatter", "json", "d"}, {"disk", "dns"}},
         CompletionCase{"FormatterValues",
                        {"--formatter", ""},
@@ -164,9 +168,10 @@ INSTANTIATE_TEST_SUITE_P(
         CompletionCase{"CompletionShells", {"--completion", ""}, {"bash", "zsh"}},
         CompletionCase{"OptionsLongThenShort", Create({""}),
                        Join(kCreateLong, {"-s", "-e", "-f", "-l"})},
-        CompletionCase{"OptionsAndGlobalsAfterDashes", Create({"--"}),
-                       Join(kCreateLong, {"--help", "--list-commands", "--formatter",
-                                          "--completion", "--reference"})},
+        CompletionCase{
+            "OptionsAndGlobalsAfterDashes", Create({"--"}),
+            Join(kCreateLong, {"--help", "--list-commands", "--formatter", "--completion",
+                               "--reference", "--version", "--verbose"})},
         CompletionCase{"OptionPrefix", Create({"--s"}), {"--size", "--secure"}},
         CompletionCase{"NoPathAfterCommand", Create({"sh"}), {}},
         CompletionCase{"NothingAfterCommandWithoutOptions", {"disk", "volume", "show", ""}, {}},
@@ -265,8 +270,11 @@ INSTANTIATE_TEST_SUITE_P(
                  {"--help:Print the help of the path", "-h:Print the help of the path",
                   "--list-commands:List every command below the path", "--formatter:Output format",
                   "--completion:Print a shell completion script",
-                  "--reference:Print the command reference in Markdown"})},
+                  "--reference:Print the command reference in Markdown",
+                  "--version:Print the version",
+                  "--verbose:With --version: list the plug-ins loaded"})},
         CompletionCase{"FreeTextIsFiles", Create({"--label", ""}), {"files"}},
+        CompletionCase{"BatchFileIsFiles", {"--batch", ""}, {"files"}},
         CompletionCase{"UnknownWordEndsCompletion", {"disk", "bogus", ""}, {""}}),
     [](const testing::TestParamInfo<CompletionCase>& info) { return info.param.name; });
 

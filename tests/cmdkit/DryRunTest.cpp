@@ -63,6 +63,8 @@ TEST(DryRunCli, AcceptedInvocationDoesNotExecute) {
     EXPECT_EQ(dry.err, "");
     EXPECT_FALSE(ran);
     EXPECT_EQ(command->lastInput, nullptr);
+    // A batch would run commands: its file is not even read.
+    EXPECT_EQ(Dry(TreeWith(command), {"--batch", "/nonexistent"}).status, 0);
 
     EXPECT_EQ(Invoke(TreeWith(command), {"a", "b", "cmd", "--level=3"}).out, "true\n");
     EXPECT_TRUE(ran);

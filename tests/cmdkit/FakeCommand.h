@@ -120,7 +120,7 @@ inline CliRun Invoke(const std::shared_ptr<AutoCli::NamespaceNode>& root,
     std::ostringstream out;
     std::ostringstream err;
     CliRun run;
-    run.status = entry(root, args, out, err);
+    run.status = entry(root, args, out, err, {});
     run.out = out.str();
     run.err = err.str();
     return run;

@@ -1,4 +1,4 @@
-// brixcli: loads every plug-in of its plug-in folder, then runs one invocation.
+// brixcli: loads every plug-in of its plug-in folder, then runs one invocation or a batch.
 #include <dlfcn.h>
 #include <fcntl.h>
 #include <unistd.h>
@@ -33,14 +33,15 @@ fs::path PluginFolder(std::error_code& error) {
 
 // Loads each *.so of the folder in name order and lets it attach its branch to `root`. A
 // plug-in that cannot be loaded is reported and skipped; the others still serve. A folder that
-// cannot be read is reported with its path.
-void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
+// cannot be read is reported with its path. Returns the paths of those loaded.
+std::vector<std::string> LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
+    std::vector<std::string> loaded;
     std::error_code error;
     const fs::path folder = PluginFolder(error);
     if (error) {
         std::cerr << "brixcli: cannot find the plug-in folder: the executable's path is unknown ("
                   << error.message() << ")\n";
-        return;
+        return loaded;
     }
     std::vector<fs::path> libraries;
     for (fs::directory_iterator it(folder, error), end; !error && it != end; it.increment(error)) {
@@ -68,11 +69,13 @@ void LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::NamespaceNode>& root) {
         }
         try {
             entry(root);
+            loaded.push_back(library.string());
         } catch (const std::exception& failure) {
             std::cerr << "brixcli: plug-in " << library.string()
                       << " failed to register: " << failure.what() << '\n';
         }
     }
+    return loaded;
 }
 
 // A standard descriptor the caller left closed is held on /dev/null, opened for reading only:
@@ -157,9 +160,9 @@ int main(int argc, char** argv) {
     auto* output = new OutputBuffer;
     std::cout.rdbuf(output);
     auto root = CmdKit::AutoCli::Namespace::New();
-    LoadPlugins(root);
+    CmdKit::AutoCli::Program program{"brixcli", BRIX_VERSION, LoadPlugins(root)};
     std::vector<std::string> args(argv + 1, argv + argc);
-    int status = CmdKit::AutoCli::RunCli(root, args, std::cout, std::cerr);
+    int status = CmdKit::AutoCli::RunCli(root, args, std::cout, std::cerr, program);
     if (!OutputWritten(*output) && status == 0) status = 1;
     std::cerr.flush();
     if (!std::cerr.good() && status == 0) status = 1;

@@ -27,6 +27,7 @@ using Args = std::vector<std::string>;
 
 constexpr const char* kUsage =
     "Usage: brixsim [--root DIR] COMMAND [ARGUMENTS]\n"
+    "       brixsim --version\n"
     "\n"
     "The host root is DIR, else $BRIX_HOST_ROOT, else\n"
     "${XDG_STATE_HOME:-$HOME/.local/state}/brixsim/default.\n"
@@ -325,6 +326,11 @@ int Main(Args args) {
     const Args rest(args.begin() + 1, args.end());
     if (command == "help" || command == "--help" || command == "-h") {
         std::cout << Usage();
+        return 0;
+    }
+    if (command == "--version") {
+        if (!rest.empty()) throw UsageError("--version: unexpected argument " + rest[0]);
+        std::cout << "brixsim " BRIX_VERSION "\n";
         return 0;
     }
     if (command == "init") return Init(rest);
