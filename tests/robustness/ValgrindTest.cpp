@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "Robustness.h"
+#include "support/BuildTree.h"
 #include "support/TestHost.h"
 
 #if defined(__SANITIZE_ADDRESS__)
@@ -64,6 +65,9 @@ TEST_P(Valgrind, RunsWithoutMemoryErrorsOrLeaks) {
                                   "--errors-for-leak-kinds=definite,indirect",
                                   "--show-leak-kinds=definite,indirect",
                                   "--error-exitcode=99",
+                                  "--suppressions=" + (BrixTest::SourceDir() / "tests" /
+                                                       "robustness" / "valgrind.supp")
+                                                          .string(),
                                   BrixRobust::Program("brixcli")};
     for (const auto& word : BrixRobust::Words(GetParam().line)) argv.push_back(word);
     const auto run = BrixTest::Run(argv);
@@ -80,7 +84,10 @@ INSTANTIATE_TEST_SUITE_P(
                       Case{"FileSetter", "system snmp set --syslocation 'Hall 9'", 0},
                       Case{"Help", "system settings advanced set --help", 0},
                       Case{"ErrorPath", "system module get --module nosuchmodule", 1,
-                           "unknown module 'nosuchmodule'\n"}),
+                           "unknown module 'nosuchmodule'\n"},
+                      Case{"PatternRefusal", "system snmp set --engineid 0x12:zz", 2,
+                           "Error: Invalid value for --engineid: 0x12:zz does not match the "
+                           "pattern (0x|0X|)[0-9a-fA-F:]+\n"}),
     [](const ::testing::TestParamInfo<Case>& info) { return std::string(info.param.name); });
 
 }  // namespace
