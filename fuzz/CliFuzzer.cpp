@@ -44,7 +44,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     for (size_t i = 0; i < messages.size(); ++i) {
         const auto c = static_cast<unsigned char>(messages[i]);
         BRIX_FUZZ_CHECK((c >= 0x20 && c != 0x7F) || c == '\n', messages);
-        if (c == '\n') lineStart = i + 1;
+        if (c == '\n') {
+            lineStart = i + 1;
+            continue;
+        }
         BRIX_FUZZ_CHECK(i - lineStart < 2048, messages);
     }
     return 0;
