@@ -9,6 +9,7 @@
 
 #include "Values.h"
 #include "cmdkit/CmdKitException.h"
+#include "cmdkit/ConstraintRule.h"
 
 namespace CmdKit {
 
@@ -79,8 +80,7 @@ bool MatchesWhole(const std::string& pattern, const std::string& value) {
 namespace CallSpec {
 
 std::shared_ptr<ParameterConstraint> ParameterConstraint::New(int type) {
-    if (type != CONSTRAINT_INT_RANGE && type != CONSTRAINT_STRING_ENUM &&
-        type != CONSTRAINT_REGEX) {
+    if (!FindConstraintRule(type)) {
         throw CmdKitException("Unknown parameter constraint type " + std::to_string(type));
     }
     return std::shared_ptr<ParameterConstraint>(new ParameterConstraint(type));

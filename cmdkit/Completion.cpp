@@ -8,6 +8,7 @@
 
 #include "Internal.h"
 #include "cmdkit/Cli.h"
+#include "cmdkit/ConstraintRule.h"
 
 namespace CmdKit::AutoCli {
 
@@ -43,15 +44,15 @@ using Table = std::vector<std::pair<std::string, std::string>>;
 // words; an option's key is its command's key, a space and the option word. Lists hold one
 // word a line.
 struct Tables {
-    Table children;      // namespace key -> its child words
-    Table options;       // command key -> its option words, long then short
-    Table flags;         // option key of an option that takes no value -> "1"
-    Table freeText;      // option key of an unconstrained string option -> "1"
-    Table values;        // option key -> the values it accepts, when they are a fixed list
-    Table descriptions;  // node key, option key or "<option key>=<value>" -> one-line summary
+    Table children;           // namespace key -> its child words
+    Table options;            // command key -> its option words, long then short
+    Table flags;              // option key of an option that takes no value -> "1"
+    Table freeText;           // option key of an unconstrained string option -> "1"
+    Table values;             // option key -> the values it accepts, when they are a fixed list
+    Table descriptions;       // node key, option key or "<option key>=<value>" -> one-line summary
     std::string globals;      // the global options taken anywhere
     std::string rootGlobals;  // those taken only before a path
-    Table globalValues;  // global option word -> its values
+    Table globalValues;       // global option word -> its values
 };
 
 std::string Lines(const std::vector<std::string>& words) {
@@ -84,10 +85,14 @@ void AddCommand(CommandSpec& command, const std::string& key, Tables& tables) {
             spellings.push_back("-" + parameter->GetShortName());
         std::vector<std::string> values;
         const auto& constraint = parameter->GetConstraint();
+        const auto* rule =
+            constraint ? CallSpec::FindConstraintRule(constraint->GetType()) : nullptr;
+        const auto choices = rule ? rule->Values(*constraint)
+                                  : std::vector<CallSpec::ParameterConstraint::EnumValue>();
         if (parameter->GetType() == CallSpec::PARAM_BOOL) {
             values = {"true", "false", "yes", "no", "1", "0"};
-        } else if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
-            for (const auto& entry : constraint->GetEnumValues()) values.push_back(entry.value);
+        } else {
+            for (const auto& entry : choices) values.push_back(entry.value);
         }
         const bool freeText = !constraint && (parameter->GetType() == CallSpec::PARAM_STRING ||
                                               parameter->GetType() == CallSpec::PARAM_STRING_LIST);
@@ -101,12 +106,10 @@ void AddCommand(CommandSpec& command, const std::string& key, Tables& tables) {
             if (freeText) tables.freeText.emplace_back(optionKey, "1");
             if (!values.empty()) tables.values.emplace_back(optionKey, Lines(values));
             if (!summary.empty()) tables.descriptions.emplace_back(optionKey, summary);
-            if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
-                for (const auto& entry : constraint->GetEnumValues()) {
-                    if (entry.description.empty()) continue;
-                    tables.descriptions.emplace_back(optionKey + "=" + entry.value,
-                                                     Summary(entry.description));
-                }
+            for (const auto& entry : choices) {
+                if (entry.description.empty()) continue;
+                tables.descriptions.emplace_back(optionKey + "=" + entry.value,
+                                                 Summary(entry.description));
             }
         }
     }

@@ -4,6 +4,7 @@
 #include <ostream>
 
 #include "Internal.h"
+#include "cmdkit/ConstraintRule.h"
 
 namespace CmdKit::Detail {
 
@@ -32,34 +33,6 @@ std::string TypeName(int type) {
     }
 }
 
-void ReplaceAll(std::string& text, const std::string& from, const std::string& to) {
-    for (size_t at = text.find(from); at != std::string::npos;
-         at = text.find(from, at + to.size())) {
-        text.replace(at, from.size(), to);
-    }
-}
-
-// Breaks `text` into lines of at most `width` characters at spaces; explicit line breaks stay.
-std::vector<std::string> Wrap(const std::string& text, size_t width) {
-    std::vector<std::string> lines;
-    size_t start = 0;
-    while (start <= text.size()) {
-        size_t end = text.find('\n', start);
-        if (end == std::string::npos) end = text.size();
-        std::string paragraph = text.substr(start, end - start);
-        while (paragraph.size() > width) {
-            size_t cut = paragraph.rfind(' ', width);
-            if (cut == std::string::npos || cut == 0) cut = paragraph.find(' ', width);
-            if (cut == std::string::npos) break;
-            lines.push_back(paragraph.substr(0, cut));
-            paragraph.erase(0, cut + 1);
-        }
-        lines.push_back(paragraph);
-        start = end + 1;
-    }
-    return lines;
-}
-
 void PrintIndented(std::ostream& out, const std::string& text, size_t indent) {
     for (const auto& line : Wrap(text, kWidth - indent)) {
         out << std::string(line.empty() ? 0 : indent, ' ') << line << '\n';
@@ -78,42 +51,15 @@ std::string Usage(const NamespaceNode& node, const std::string& program) {
 // The parameter's description with "%ENUM%" and "%FULLENUM%" filled in, then its constraint
 // where the description did not already show it, then the required marker.
 std::string ParameterText(const CallSpec::ParameterSpec& parameter) {
-    std::string text = parameter.GetDescription();
+    const std::string& description = parameter.GetDescription();
+    const bool valuesShown = description.find("%ENUM%") != std::string::npos ||
+                             description.find("%FULLENUM%") != std::string::npos;
+    std::string text = ExpandEnumPlaceholders(parameter, description, "\n  ");
     const auto& constraint = parameter.GetConstraint();
-    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
-        std::string values;
-        std::string full;
-        for (const auto& entry : constraint->GetEnumValues()) {
-            if (!values.empty()) values += ", ";
-            values += entry.value;
-            full += "\n  " + entry.value;
-            if (!entry.description.empty()) full += ": " + entry.description;
-        }
-        const bool shown = text.find("%ENUM%") != std::string::npos ||
-                           text.find("%FULLENUM%") != std::string::npos;
-        ReplaceAll(text, "%FULLENUM%", full);
-        ReplaceAll(text, "%ENUM%", values);
-        if (!shown) text += (text.empty() ? "" : " ") + std::string("(one of: ") + values + ")";
-    } else {
-        ReplaceAll(text, "%FULLENUM%", "");
-        ReplaceAll(text, "%ENUM%", "");
-    }
-    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_INT_RANGE) {
-        std::string range;
-        if (constraint->GetMin() == INT64_MIN && constraint->GetMax() != INT64_MAX) {
-            range = "at most " + std::to_string(constraint->GetMax());
-        } else if (constraint->GetMin() != INT64_MIN && constraint->GetMax() == INT64_MAX) {
-            range = "at least " + std::to_string(constraint->GetMin());
-        } else if (constraint->GetMin() != INT64_MIN) {
-            range =
-                std::to_string(constraint->GetMin()) + ".." + std::to_string(constraint->GetMax());
-        }
-        if (!range.empty())
-            text += (text.empty() ? "" : " ") + std::string("(range ") + range + ")";
-    }
-    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_REGEX) {
-        text +=
-            (text.empty() ? "" : " ") + std::string("(must match ") + constraint->GetRegex() + ")";
+    if (const auto* rule =
+            constraint ? CallSpec::FindConstraintRule(constraint->GetType()) : nullptr) {
+        const std::string note = rule->HelpNote(*constraint, valuesShown);
+        if (!note.empty()) text += (text.empty() ? "" : " ") + note;
     }
     if (parameter.GetType() == CallSpec::PARAM_STRING_LIST) {
         text += (text.empty() ? "" : " ") + std::string("(may be repeated)");

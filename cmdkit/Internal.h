@@ -1,6 +1,7 @@
 // The framework's private pieces: option lookup, help and formatters.
 #pragma once
 
+#include <cstdint>
 #include <iosfwd>
 #include <map>
 #include <memory>
@@ -23,10 +24,18 @@ inline bool TakesValue(const CallSpec::ParameterSpec& parameter) {
     return parameter.GetType() != CallSpec::PARAM_FLAG;
 }
 
-// A parameter description with "%ENUM%" replaced by the enumeration's values, comma-separated,
+// Text helpers (Text.cpp).
+// A parameter description with "%ENUM%" replaced by its constraint's values, comma-separated,
 // and "%FULLENUM%" by each value with its description, each after `lineBreak`.
 std::string ExpandEnumPlaceholders(const CallSpec::ParameterSpec& parameter,
                                    const std::string& description, const std::string& lineBreak);
+void ReplaceAll(std::string& text, const std::string& from, const std::string& to);
+// Breaks `text` into lines of at most `width` characters at spaces; explicit line breaks stay.
+std::vector<std::string> Wrap(const std::string& text, size_t width);
+std::string Join(const std::vector<std::string>& values, const std::string& separator);
+// An integer range as help and the reference show it: "1..10", "at least 1", "at most 10", or
+// empty for an unbounded one.
+std::string RangeText(int64_t min, int64_t max);
 
 // The help of a namespace or command, its usage line naming `program`.
 void PrintHelp(AutoCli::NamespaceNode& node, const std::string& program, std::ostream& out);

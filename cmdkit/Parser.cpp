@@ -2,6 +2,7 @@
 #include "Internal.h"
 #include "Values.h"
 #include "cmdkit/Cli.h"
+#include "cmdkit/ConstraintRule.h"
 #include "cmdkit/Text.h"
 
 namespace CmdKit {
@@ -55,15 +56,6 @@ std::string BothNames(const CallSpec::ParameterSpec& parameter) {
     Refuse("Invalid value for " + OptionName(parameter) + ": " + shown + " " + reason);
 }
 
-std::string JoinEnum(const CallSpec::ParameterConstraint& constraint) {
-    std::string text;
-    for (const auto& entry : constraint.GetEnumValues()) {
-        if (!text.empty()) text += ", ";
-        text += entry.value;
-    }
-    return text;
-}
-
 void CheckType(const CallSpec::ParameterSpec& parameter, const std::string& value) {
     switch (parameter.GetType()) {
         case CallSpec::PARAM_INT: {
@@ -90,34 +82,10 @@ void CheckType(const CallSpec::ParameterSpec& parameter, const std::string& valu
 
 void CheckConstraint(const CallSpec::ParameterSpec& parameter, const std::string& value) {
     const auto& constraint = parameter.GetConstraint();
-    if (!constraint) return;
-    switch (constraint->GetType()) {
-        case CallSpec::CONSTRAINT_INT_RANGE: {
-            if (parameter.GetType() != CallSpec::PARAM_INT) break;
-            int64_t number = 0;
-            Detail::ParseInt64(value, number);
-            if (number < constraint->GetMin() || number > constraint->GetMax()) {
-                RefuseValue(parameter, value,
-                            "is not in the range " + std::to_string(constraint->GetMin()) + ".." +
-                                std::to_string(constraint->GetMax()));
-            }
-            break;
-        }
-        case CallSpec::CONSTRAINT_STRING_ENUM: {
-            for (const auto& entry : constraint->GetEnumValues()) {
-                if (entry.value == value) return;
-            }
-            RefuseValue(parameter, value, "is not one of: " + JoinEnum(*constraint));
-        }
-        case CallSpec::CONSTRAINT_REGEX: {
-            if (!Detail::MatchesWhole(constraint->GetRegex(), value)) {
-                RefuseValue(parameter, value,
-                            "does not match the pattern " + constraint->GetRegex());
-            }
-            break;
-        }
-        default:
-            break;
+    const auto* rule = constraint ? CallSpec::FindConstraintRule(constraint->GetType()) : nullptr;
+    if (!rule) return;
+    if (const std::string reason = rule->Refusal(parameter, *constraint, value); !reason.empty()) {
+        RefuseValue(parameter, value, reason);
     }
 }
 

@@ -7,42 +7,10 @@
 
 #include "Internal.h"
 #include "cmdkit/Cli.h"
+#include "cmdkit/ConstraintRule.h"
+#include "cmdkit/Text.h"
 
 namespace CmdKit {
-
-namespace Detail {
-
-namespace {
-
-void ReplaceAll(std::string& text, const std::string& from, const std::string& to) {
-    for (size_t at = text.find(from); at != std::string::npos;
-         at = text.find(from, at + to.size())) {
-        text.replace(at, from.size(), to);
-    }
-}
-
-}  // namespace
-
-std::string ExpandEnumPlaceholders(const CallSpec::ParameterSpec& parameter,
-                                   const std::string& description, const std::string& lineBreak) {
-    std::string values;
-    std::string full;
-    const auto& constraint = parameter.GetConstraint();
-    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
-        for (const auto& entry : constraint->GetEnumValues()) {
-            if (!values.empty()) values += ", ";
-            values += entry.value;
-            full += lineBreak + entry.value;
-            if (!entry.description.empty()) full += ": " + entry.description;
-        }
-    }
-    std::string text = description;
-    ReplaceAll(text, "%FULLENUM%", full);
-    ReplaceAll(text, "%ENUM%", values);
-    return text;
-}
-
-}  // namespace Detail
 
 namespace AutoCli {
 
@@ -51,41 +19,6 @@ namespace {
 using MetaObj::MetaList;
 using MetaObj::MetaObject;
 using MetaObj::MetaStruct;
-
-// Text for a table cell or paragraph: no HTML, no cell break, line breaks kept.
-std::string Text(const std::string& text) {
-    std::string escaped;
-    for (char c : text) {
-        switch (c) {
-            case '<':
-                escaped += "&lt;";
-                break;
-            case '>':
-                escaped += "&gt;";
-                break;
-            case '|':
-                escaped += "\\|";
-                break;
-            case '\n':
-                escaped += "<br>";
-                break;
-            default:
-                escaped += c;
-        }
-    }
-    return escaped;
-}
-
-// A code span; a table cell break inside it is escaped too.
-std::string Code(const std::string& text) {
-    std::string escaped;
-    for (char c : text) {
-        if (c == '|') escaped += '\\';
-        escaped += c;
-    }
-    const bool hasTick = escaped.find('`') != std::string::npos;
-    return hasTick ? "`` " + escaped + " ``" : "`" + escaped + "`";
-}
 
 // The heading anchor a Markdown renderer makes of a path.
 std::string Anchor(const std::string& path) {
@@ -118,39 +51,8 @@ std::string TypeName(int type) {
 }
 
 std::string ConstraintText(const CallSpec::ParameterConstraint* constraint) {
-    if (!constraint) return "";
-    switch (constraint->GetType()) {
-        case CallSpec::CONSTRAINT_STRING_ENUM: {
-            // Values with descriptions one a line, bare values on one line.
-            bool described = false;
-            for (const auto& entry : constraint->GetEnumValues()) {
-                described = described || !entry.description.empty();
-            }
-            std::string text = "one of:";
-            const char* separator = " ";
-            for (const auto& entry : constraint->GetEnumValues()) {
-                text += (described ? "<br>" : separator) + Code(entry.value);
-                if (!entry.description.empty()) text += ": " + Text(entry.description);
-                separator = ", ";
-            }
-            return text;
-        }
-        case CallSpec::CONSTRAINT_INT_RANGE: {
-            const bool hasMin = constraint->GetMin() != INT64_MIN;
-            const bool hasMax = constraint->GetMax() != INT64_MAX;
-            if (hasMin && hasMax) {
-                return "range " + std::to_string(constraint->GetMin()) + ".." +
-                       std::to_string(constraint->GetMax());
-            }
-            if (hasMin) return "at least " + std::to_string(constraint->GetMin());
-            if (hasMax) return "at most " + std::to_string(constraint->GetMax());
-            return "";
-        }
-        case CallSpec::CONSTRAINT_REGEX:
-            return "matches " + Code(constraint->GetRegex());
-        default:
-            return "";
-    }
+    const auto* rule = constraint ? CallSpec::FindConstraintRule(constraint->GetType()) : nullptr;
+    return rule ? rule->ReferenceText(*constraint) : "";
 }
 
 // The type of a result or field; a structure met on the way is queued for its own table.
@@ -165,14 +67,14 @@ std::string ResultType(const MetaObject& object, std::deque<const MetaStruct*>& 
         case MetaObj::META_STRUCT: {
             const auto& structure = static_cast<const MetaStruct&>(object);
             structures.push_back(&structure);
-            return "structure " + Code(structure.GetName());
+            return "structure " + MarkdownCode(structure.GetName());
         }
         case MetaObj::META_LIST: {
             const auto& list = static_cast<const MetaList&>(object);
             if (list.GetElementType() == MetaObj::META_STRING) return "list of strings";
             if (!list.GetPrototype()) return "list of structures";
             structures.push_back(list.GetPrototype().get());
-            return "list of " + Code(list.GetPrototype()->GetName()) + " structures";
+            return "list of " + MarkdownCode(list.GetPrototype()->GetName()) + " structures";
         }
     }
     return "?";
@@ -186,13 +88,14 @@ void WriteParameters(const CallSpec::InputSpec& spec, std::ostream& out) {
     out << "| Option | Short | Type | Required | Constraint | Description |\n"
         << "|---|---|---|---|---|---|\n";
     for (const auto& parameter : spec.GetParameters()) {
-        std::string description =
-            Text(Detail::ExpandEnumPlaceholders(*parameter, parameter->GetDescription(), "\n"));
+        std::string description = MarkdownText(
+            Detail::ExpandEnumPlaceholders(*parameter, parameter->GetDescription(), "\n"));
         if (parameter->IsSecret()) {
             description += std::string(description.empty() ? "" : " ") + "(secret: never echoed)";
         }
-        out << "| " << Code("--" + parameter->GetName()) << " | "
-            << (parameter->GetShortName().empty() ? "" : Code("-" + parameter->GetShortName()))
+        out << "| " << MarkdownCode("--" + parameter->GetName()) << " | "
+            << (parameter->GetShortName().empty() ? ""
+                                                  : MarkdownCode("-" + parameter->GetShortName()))
             << " | " << TypeName(parameter->GetType()) << " | "
             << (parameter->IsRequired() ? "yes" : "no") << " | "
             << ConstraintText(parameter->GetConstraint().get()) << " | " << description << " |\n";
@@ -212,10 +115,10 @@ void WriteResult(const MetaObject* root, std::ostream& out) {
         const MetaStruct* structure = structures.front();
         structures.pop_front();
         if (!written.insert(structure->GetName()).second) continue;
-        out << "Fields of " << Code(structure->GetName()) << ":\n\n"
+        out << "Fields of " << MarkdownCode(structure->GetName()) << ":\n\n"
             << "| Field | Type |\n|---|---|\n";
         for (const auto& field : structure->GetFields()) {
-            out << "| " << Code(field.name) << " | "
+            out << "| " << MarkdownCode(field.name) << " | "
                 << (field.value ? ResultType(*field.value, structures) : "?") << " |\n";
         }
         out << '\n';
@@ -234,12 +137,13 @@ void WriteNode(NamespaceNode& node, std::ostream& out) {
     const std::string path = node.GetPathString(' ');
     if (!path.empty()) {
         out << "## " << path << "\n\n";
-        if (!node.GetDescription().empty()) out << Text(node.GetDescription()) << "\n\n";
+        if (!node.GetDescription().empty()) out << MarkdownText(node.GetDescription()) << "\n\n";
         if (node.GetType() == NodeType::Command) {
             auto& command = dynamic_cast<CommandSpec&>(node);
             const std::string kind = command.GetMetaDataField("type");
-            if (!kind.empty()) out << "Kind: " << Text(kind) << ". ";
-            out << "Default formatter: " << Code(command.GetDefaultOutputFormatter()) << ".\n\n";
+            if (!kind.empty()) out << "Kind: " << MarkdownText(kind) << ". ";
+            out << "Default formatter: " << MarkdownCode(command.GetDefaultOutputFormatter())
+                << ".\n\n";
             WriteParameters(*command.GetInputSpec(), out);
             WriteResult(command.GetOutputSpec()->GetRootObject().get(), out);
             return;

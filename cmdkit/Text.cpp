@@ -1,9 +1,12 @@
 // Text made safe for output: valid UTF-8 for the formatters, one escaped line for messages.
 #include "cmdkit/Text.h"
 
+#include <boost/algorithm/string/replace.hpp>
+#include <cstdint>
 #include <cstdio>
 
 #include "Internal.h"
+#include "cmdkit/ConstraintRule.h"
 
 namespace CmdKit {
 
@@ -112,6 +115,39 @@ std::string EscapedLine(std::string_view text, size_t limit) {
 
 }  // namespace
 
+std::string MarkdownText(std::string_view text) {
+    std::string escaped;
+    for (char c : text) {
+        switch (c) {
+            case '<':
+                escaped += "&lt;";
+                break;
+            case '>':
+                escaped += "&gt;";
+                break;
+            case '|':
+                escaped += "\\|";
+                break;
+            case '\n':
+                escaped += "<br>";
+                break;
+            default:
+                escaped += c;
+        }
+    }
+    return escaped;
+}
+
+std::string MarkdownCode(std::string_view text) {
+    std::string escaped;
+    for (char c : text) {
+        if (c == '|') escaped += '\\';
+        escaped += c;
+    }
+    const bool hasTick = escaped.find('`') != std::string::npos;
+    return hasTick ? "`` " + escaped + " ``" : "`" + escaped + "`";
+}
+
 std::string MessageExcerpt(std::string_view value) {
     return EscapedLine(value, 128);
 }
@@ -148,6 +184,68 @@ std::string PrintableText(std::string_view text, std::string_view kept) {
 
 std::string MessageLine(std::string_view message) {
     return EscapedLine(message, 1024);
+}
+
+void ReplaceAll(std::string& text, const std::string& from, const std::string& to) {
+    boost::algorithm::replace_all(text, from, to);
+}
+
+std::vector<std::string> Wrap(const std::string& text, size_t width) {
+    std::vector<std::string> lines;
+    size_t start = 0;
+    while (start <= text.size()) {
+        size_t end = text.find('\n', start);
+        if (end == std::string::npos) end = text.size();
+        std::string paragraph = text.substr(start, end - start);
+        while (paragraph.size() > width) {
+            size_t cut = paragraph.rfind(' ', width);
+            if (cut == std::string::npos || cut == 0) cut = paragraph.find(' ', width);
+            if (cut == std::string::npos) break;
+            lines.push_back(paragraph.substr(0, cut));
+            paragraph.erase(0, cut + 1);
+        }
+        lines.push_back(paragraph);
+        start = end + 1;
+    }
+    return lines;
+}
+
+std::string Join(const std::vector<std::string>& values, const std::string& separator) {
+    std::string text;
+    for (const auto& value : values) {
+        if (!text.empty()) text += separator;
+        text += value;
+    }
+    return text;
+}
+
+std::string RangeText(int64_t min, int64_t max) {
+    const bool hasMin = min != INT64_MIN;
+    const bool hasMax = max != INT64_MAX;
+    if (hasMin && hasMax) return std::to_string(min) + ".." + std::to_string(max);
+    if (hasMin) return "at least " + std::to_string(min);
+    if (hasMax) return "at most " + std::to_string(max);
+    return "";
+}
+
+std::string ExpandEnumPlaceholders(const CallSpec::ParameterSpec& parameter,
+                                   const std::string& description, const std::string& lineBreak) {
+    std::string values;
+    std::string full;
+    const auto& constraint = parameter.GetConstraint();
+    const auto* rule = constraint ? CallSpec::FindConstraintRule(constraint->GetType()) : nullptr;
+    if (rule) {
+        for (const auto& entry : rule->Values(*constraint)) {
+            if (!values.empty()) values += ", ";
+            values += entry.value;
+            full += lineBreak + entry.value;
+            if (!entry.description.empty()) full += ": " + entry.description;
+        }
+    }
+    std::string text = description;
+    ReplaceAll(text, "%FULLENUM%", full);
+    ReplaceAll(text, "%ENUM%", values);
+    return text;
 }
 
 }  // namespace Detail

@@ -14,4 +14,9 @@ namespace CmdKit {
 // `... (N bytes)` with the value's whole length.
 std::string MessageExcerpt(std::string_view value);
 
+// Text for a Markdown table cell or paragraph: no HTML, no cell break, line breaks as `<br>`.
+std::string MarkdownText(std::string_view text);
+// A Markdown code span; a table cell break inside it is escaped too.
+std::string MarkdownCode(std::string_view text);
+
 }  // namespace CmdKit
