@@ -154,7 +154,11 @@ TEST(SnmpTrapd, WarmStartsReachAnIndependentReceiver) {
                          "createUser -e " +
                          agent +
                          " erin SHA erinsecret1 AES erinprivacy\n"
-                         "createUser carol SHA carolauth1 AES carolpriv1\n");
+                         "createUser carol SHA carolauth1 AES carolpriv1\n"
+                         "createUser -e " +
+                         agent +
+                         " frank\n"
+                         "createUser gina\n");
     ASSERT_TRUE(trapd.Started()) << trapd.Log();
 
     // The agent's own hashes for alice and bob come from `system snmp hash`.
@@ -210,6 +214,13 @@ TEST(SnmpTrapd, WarmStartsReachAnIndependentReceiver) {
     std::this_thread::sleep_for(std::chrono::milliseconds(200));
     EXPECT_EQ(trapd.Count("user dave"), 0u) << trapd.Log();
     EXPECT_EQ(trapd.Count("user erin"), 0u) << trapd.Log();
+
+    // Without authentication no key is localized, so the engine id a user names is moot.
+    Set(host, {"-R", "frank/none/-/none/-/0102030405,gina/none/-/none/-/0102030405", "-i",
+               trapd.At() + "/frank/none/trap," + trapd.At() + "/gina/none/inform"});
+    ExpectTestPasses(host, "There are 2 targets configured");
+    EXPECT_TRUE(trapd.WaitFor("TRAP2, SNMP v3, user frank", 1)) << trapd.Log();
+    EXPECT_TRUE(trapd.WaitFor("INFORM, SNMP v3, user gina", 1)) << trapd.Log();
 }
 
 }  // namespace

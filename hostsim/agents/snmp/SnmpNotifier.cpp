@@ -148,8 +148,9 @@ void SendV1(const V1Target& target, const AgentState& agent) {
 }
 
 void SendV3Trap(const V3Target& target, const RemoteUser& user, const AgentState& agent) {
-    // A trap comes from the agent's own engine: the user's keys must be localized for it.
-    if (FromHex(user.engineId) != agent.engineId) {
+    // A trap comes from the agent's own engine: keys, where the level needs them, must be
+    // localized for it. Without authentication the user's engine id is no concern.
+    if (target.level != "none" && FromHex(user.engineId) != agent.engineId) {
         Fail("remote user '" + user.name + "' is localized for engine id " + user.engineId +
              ", but traps are sent from this agent's engine id " + ToHex(agent.engineId));
     }
@@ -196,7 +197,7 @@ void SendV3Inform(const V3Target& target, const RemoteUser& user, const AgentSta
                                                      BuildPdu(Ber::kGetRequest, RandomId(), {})),
                                       probeId, "engine id discovery");
     if (report.engineId.empty()) Fail("the receiver did not tell its engine id");
-    if (FromHex(user.engineId) != report.engineId) {
+    if (target.level != "none" && FromHex(user.engineId) != report.engineId) {
         Fail("the receiver's engine id is " + ToHex(report.engineId) + ", but remote user '" +
              user.name + "' is localized for engine id " + user.engineId);
     }
