@@ -38,27 +38,30 @@ struct WriteFault {
 };
 
 // Output that is lost is an error, whether it fails at the last flush (a short answer) or while
-// the listing is written (a long one).
+// the listing is written (a long one), in every tool: a backup cut short must not look complete.
 TEST(ToolEdges, OutputThatCannotBeWrittenFailsTheRun) {
     BrixTest::TempHost host;
     const std::vector<WriteFault> faults = {
         {"full device", ">/dev/full", "No space left on device"},
         {"closed", ">&-", "Bad file descriptor"}};
-    const std::vector<std::vector<std::string>> invocations = {
-        {"system", "uuid", "get"},
-        {"--list-commands"},
-        {"--formatter=json", "system", "process", "list"}};
+    const std::string root = host.Root().string();
+    const std::vector<std::pair<std::string, std::vector<std::string>>> invocations = {
+        {"brixcli", {"system", "uuid", "get"}},
+        {"brixcli", {"--list-commands"}},
+        {"brixcli", {"--formatter=json", "system", "process", "list"}},
+        {"brixsim", {"--root", root, "export"}},
+        {"brixsim", {"--root", root, "fault", "ops"}},
+        {"brixsim", {"--help"}}};
     for (const auto& fault : faults) {
-        for (const auto& args : invocations) {
+        for (const auto& [tool, args] : invocations) {
             std::vector<std::string> argv = {"sh", "-c",
                                              std::string("exec \"$0\" \"$@\" ") + fault.redirection,
-                                             BrixRobust::Program("brixcli")};
+                                             BrixRobust::Program(tool)};
             argv.insert(argv.end(), args.begin(), args.end());
             const auto run = BrixTest::Run(argv);
-            EXPECT_EQ(run.status, 1) << fault.name << " " << args.front();
-            EXPECT_EQ(run.err,
-                      std::string("brixcli: cannot write the output: ") + fault.reason + "\n")
-                << fault.name << " " << args.front();
+            EXPECT_EQ(run.status, 1) << fault.name << " " << tool << " " << args.back();
+            EXPECT_EQ(run.err, tool + ": cannot write the output: " + fault.reason + "\n")
+                << fault.name << " " << tool << " " << args.back();
         }
     }
 }

@@ -16,6 +16,7 @@
 #include <string>
 #include <vector>
 
+#include "ToolOutput.h"
 #include "core/Registry.h"
 #include "core/StateTransfer.h"
 #include "core/Store.h"
@@ -342,11 +343,9 @@ int Main(Args args) {
     throw UsageError("unknown command " + command);
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int Run(const Args& args) {
     try {
-        return Main(Args(argv + 1, argv + argc));
+        return Main(args);
     } catch (const UsageError& e) {
         std::cerr << "brixsim: " << e.what() << "\n\n" << Usage();
         return 2;
@@ -354,4 +353,12 @@ int main(int argc, char** argv) {
         std::cerr << "brixsim: " << e.what() << "\n";
         return 1;
     }
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    BrixTools::HoldClosedStandardDescriptors();
+    const auto& output = BrixTools::CaptureStandardOutput();
+    return BrixTools::FinishOutput("brixsim", output, Run(Args(argv + 1, argv + argc)));
 }
