@@ -22,10 +22,17 @@ namespace {
 constexpr const char* kEnter = "hostsvc/maintenance_mode_enter";
 constexpr const char* kExit = "hostsvc/maintenance_mode_exit";
 
+// A call of the wrong shape gets the usage; a wrong value only the one line that names it, which
+// is what the caller shows its user.
 int Usage(const std::string& problem) {
     std::cerr << "mgmt-cmd: " << problem << "\n"
               << "Usage: mgmt-cmd " << kEnter << " TIMEOUT [MODE]\n"
               << "       mgmt-cmd " << kExit << " TIMEOUT [MODE]\n";
+    return 2;
+}
+
+int BadValue(const std::string& problem) {
+    std::cerr << "mgmt-cmd: " << problem << "\n";
     return 2;
 }
 
@@ -45,12 +52,13 @@ int main(int argc, char** argv) {
     if (args.size() < 2 || args.size() > 3) return Usage("wrong number of arguments");
     int64_t timeout = 0;
     if (!ParseTimeout(args[1], timeout)) {
-        return Usage("invalid timeout '" + args[1] + "': expected a number of seconds");
+        return BadValue("invalid timeout '" + args[1] +
+                        "': expected a number of seconds, 0 or more");
     }
     const std::string mode = args.size() > 2 ? args[2] : "ensureObjectAccessibility";
     if (!BrixSim::Maintenance::IsDornaMode(mode)) {
-        return Usage("invalid mode '" + mode +
-                     "': expected noAction, ensureObjectAccessibility or evacuateAllData");
+        return BadValue("invalid mode '" + mode +
+                        "': expected noAction, ensureObjectAccessibility or evacuateAllData");
     }
     try {
         if (command == kEnter) {

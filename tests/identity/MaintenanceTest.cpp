@@ -114,17 +114,18 @@ TEST(MaintenanceMode, ServiceToolChecksItsArguments) {
         std::vector<std::string> args;
         int status;
         std::string firstLine;
+        bool usage = false;  // a call of the wrong shape also gets the usage, a wrong value not
     };
     const Case cases[] = {
         {{"hostsvc/maintenance_mode_exit", "0", "ensureObjectAccessibility"},
          1,
          "The host is not in maintenance mode."},
-        {{}, 2, "mgmt-cmd: missing command"},
-        {{"hostsvc/reboot", "0"}, 2, "mgmt-cmd: unknown command 'hostsvc/reboot'"},
-        {{"hostsvc/maintenance_mode_enter"}, 2, "mgmt-cmd: wrong number of arguments"},
+        {{}, 2, "mgmt-cmd: missing command", true},
+        {{"hostsvc/reboot", "0"}, 2, "mgmt-cmd: unknown command 'hostsvc/reboot'", true},
+        {{"hostsvc/maintenance_mode_enter"}, 2, "mgmt-cmd: wrong number of arguments", true},
         {{"hostsvc/maintenance_mode_enter", "-5", "noAction"},
          2,
-         "mgmt-cmd: invalid timeout '-5': expected a number of seconds"},
+         "mgmt-cmd: invalid timeout '-5': expected a number of seconds, 0 or more"},
         {{"hostsvc/maintenance_mode_enter", "0", "wipe"},
          2,
          "mgmt-cmd: invalid mode 'wipe': expected noAction, ensureObjectAccessibility or "
@@ -141,6 +142,7 @@ TEST(MaintenanceMode, ServiceToolChecksItsArguments) {
         auto run = BrixTest::Run(argv);
         EXPECT_EQ(run.status, c.status);
         EXPECT_EQ(run.err.substr(0, run.err.find('\n')), c.firstLine);
+        EXPECT_EQ(run.err.find("Usage:") != std::string::npos, c.usage);
     }
     EXPECT_EQ(State(host), "Enabled");
 }
