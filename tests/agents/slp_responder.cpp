@@ -186,8 +186,11 @@ void Responder::HandleUdp() {
                                     reinterpret_cast<sockaddr*>(&from), &length);
     if (size <= 0) return;
     buffer.resize(static_cast<size_t>(size));
-    const auto request = ParseRequest(buffer, "udp");
+    auto request = ParseRequest(buffer, "udp");
     if (!request) return;
+    char source[INET_ADDRSTRLEN] = "";
+    ::inet_ntop(AF_INET, &from.sin_addr, source, sizeof source);
+    request->source = source;
     {
         std::lock_guard<std::mutex> lock(mutex_);
         requests_.push_back(*request);

@@ -28,6 +28,7 @@ enum class Behaviour {
 
 struct Request {
     std::string transport;  // "udp" or "tcp"
+    std::string source;     // the sender's IPv4 address, over UDP
     uint8_t function = 0;
     uint16_t flags = 0;
     uint16_t xid = 0;

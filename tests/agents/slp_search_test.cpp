@@ -41,12 +41,11 @@ void SetHostValues(const BrixTest::TempHost& host,
     host.Import(state);
 }
 
-// A host whose searches wait at most `waitMs` and send multicast on loopback. Searches that get
-// their answer return at once; the wait leaves room for a loaded machine.
+// A host whose searches wait at most `waitMs`. Searches that get their answer return at once;
+// the wait leaves room for a loaded machine.
 void ShortWaits(const BrixTest::TempHost& host, int waitMs = 1500) {
     SetHostValues(host, {{"slp.ua.multicast_wait_ms", std::to_string(waitMs)},
-                         {"slp.ua.unicast_wait_ms", std::to_string(waitMs)},
-                         {"slp.ua.interface", "127.0.0.1"}});
+                         {"slp.ua.unicast_wait_ms", std::to_string(waitMs)}});
 }
 
 BrixTest::RunResult Search(const BrixTest::TempHost& host, std::vector<std::string> options) {
@@ -98,6 +97,9 @@ TEST(SlpSearch, ServiceTypeDefaultsAndPrefix) {
         {{}, "service:service-agent"},
         {{"-s", "service:printer:lpr"}, "service:printer:lpr"},
         {{"--service", "brix-mgmt"}, "service:brix-mgmt"},
+        // The scheme is case-insensitive, and not put in front a second time.
+        {{"-s", "SERVICE:wbem"}, "service:wbem"},
+        {{"-s", "Service:printer:lpr"}, "service:printer:lpr"},
     };
     for (const auto& [options, type] : cases) {
         Responder responder(kServices);
@@ -186,6 +188,8 @@ TEST(SlpSearch, MulticastCollectsAnswers) {
     EXPECT_EQ(requests[0].previousResponders, "");
     EXPECT_EQ(requests[1].previousResponders, "127.0.0.1");
     EXPECT_EQ(requests[0].xid, requests[1].xid);
+    // The seeded host searches this machine only: the request left by loopback.
+    EXPECT_EQ(requests[0].source, "127.0.0.1");
 
     // The protocol option alone is accepted and does not turn the search into a unicast one.
     Responder again(kServices);
@@ -193,6 +197,13 @@ TEST(SlpSearch, MulticastCollectsAnswers) {
     ASSERT_EQ(udp.status, 0) << udp.err;
     ASSERT_FALSE(again.Requests().empty());
     EXPECT_EQ(again.Requests()[0].flags, 0x2000);
+
+    // An empty interface setting means loopback too, never the routing table's choice.
+    SetHostValues(host, {{"slp.ua.interface", ""}});
+    Responder unset(kServices);
+    ASSERT_EQ(Search(host, {"-P", "udp", "-p", std::to_string(unset.Port())}).status, 0);
+    ASSERT_FALSE(unset.Requests().empty());
+    EXPECT_EQ(unset.Requests()[0].source, "127.0.0.1");
 }
 
 TEST(SlpSearch, ErrorsAndRefusals) {

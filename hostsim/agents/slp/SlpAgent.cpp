@@ -3,7 +3,8 @@
 //
 // Host settings read at each search (all optional):
 //   slp.ua.interface          IPv4 address of the interface that sends multicast requests
-//                             (empty: the routing table's choice)
+//                             (empty: loopback; a search leaves this machine only when the
+//                             user names another interface)
 //   slp.ua.scopes             scope list of the requests (default "DEFAULT")
 //   slp.ua.multicast_wait_ms  how long a multicast search collects answers (default 1500)
 //   slp.ua.unicast_wait_ms    how long a unicast search waits for its answer (default 1500)
@@ -18,6 +19,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <boost/algorithm/string/predicate.hpp>
 #include <cerrno>
 #include <chrono>
 #include <cstring>
@@ -52,6 +54,8 @@ constexpr const char* kGetStats = "HostCtl::System::SlpAgent::GetStats";
 
 constexpr const char* kDefaultService = "service-agent";
 constexpr int64_t kDefaultWaitMs = 1500;
+// Where multicast searches go unless the user names an interface: this machine only.
+constexpr const char* kLoopback = "127.0.0.1";
 constexpr int64_t kMaxWaitMs = 60'000;
 // Largest reply accepted over TCP; anything longer is not an answer to a service request.
 constexpr uint32_t kMaxTcpReply = 1 << 20;
@@ -61,7 +65,7 @@ const bool registered = [] {
                                  kSetSearchService, kSetSearchTcp, kGetStats});
     // The user agent's settings, written out so that an exported host shows them.
     return BrixSim::RegisterTables({"slp-ua", "", [](Store& store) {
-                                        store.SetValue("slp.ua.interface", "");
+                                        store.SetValue("slp.ua.interface", kLoopback);
                                         store.SetValue("slp.ua.scopes", "DEFAULT");
                                         store.SetInt("slp.ua.multicast_wait_ms", kDefaultWaitMs);
                                         store.SetInt("slp.ua.unicast_wait_ms", kDefaultWaitMs);
@@ -99,7 +103,9 @@ Settings ReadSettings() {
         return std::chrono::milliseconds(
             std::clamp<int64_t>(store.GetInt(key, kDefaultWaitMs), 0, kMaxWaitMs));
     };
-    return {store.GetValue("slp.ua.interface", ""), store.GetValue("slp.ua.scopes", "DEFAULT"),
+    std::string interface = store.GetValue("slp.ua.interface", "");
+    if (interface.empty()) interface = kLoopback;
+    return {interface, store.GetValue("slp.ua.scopes", "DEFAULT"),
             wait("slp.ua.multicast_wait_ms"), wait("slp.ua.unicast_wait_ms")};
 }
 
@@ -143,7 +149,7 @@ public:
         if (socket.Fd() < 0) Fail("SLP multicast search failed: " + ErrnoText(errno));
         const int ttl = 255;
         ::setsockopt(socket.Fd(), IPPROTO_IP, IP_MULTICAST_TTL, &ttl, sizeof ttl);
-        if (!settings.interface.empty()) {
+        {
             in_addr address{};
             if (::inet_pton(AF_INET, settings.interface.c_str(), &address) != 1) {
                 Fail("Invalid SLP multicast interface address: " +
@@ -267,10 +273,14 @@ public:
 private:
     [[noreturn]] static void Fail(const std::string& message) { throw HostCtlException(message); }
 
-    // Service types are URL schemes below "service:"; a bare name is taken as such a type.
+    // Service types are URL schemes below "service:", in any case; a bare name is taken as such
+    // a type.
     std::string ServiceType() const {
-        if (service_.rfind("service:", 0) == 0) return service_;
-        return "service:" + service_;
+        constexpr std::string_view kScheme = "service:";
+        if (boost::algorithm::istarts_with(service_, kScheme)) {
+            return std::string(kScheme) + service_.substr(kScheme.size());
+        }
+        return std::string(kScheme) + service_;
     }
 
     // Sends over UDP and waits for the first well-formed answer, asking once more a third of
