@@ -4,7 +4,7 @@
 #include <random>
 
 #include "agents/slp/SlpWire.h"
-#include "slp_responder.h"
+#include "SlpResponder.h"
 
 namespace {
 

@@ -1,4 +1,4 @@
-#include "slp_responder.h"
+#include "SlpResponder.h"
 
 #include <arpa/inet.h>
 #include <netinet/in.h>

@@ -5,7 +5,7 @@
 
 #include <pugixml.hpp>
 
-#include "snmp_support.h"
+#include "SnmpSupport.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
-#include "snmp_support.h"
+#include "SnmpSupport.h"
 
 namespace {
 

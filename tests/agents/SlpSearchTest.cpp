@@ -5,7 +5,7 @@
 #include <map>
 
 #include "brixcli/SystemPlugin.h"
-#include "slp_responder.h"
+#include "SlpResponder.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -15,7 +15,7 @@
 #include <thread>
 
 #include "agents/snmp/UsmKeys.h"
-#include "snmp_support.h"
+#include "SnmpSupport.h"
 
 extern char** environ;
 
