@@ -31,6 +31,11 @@ std::map<std::string, FileSystemType>& FileSystemTypes() {
     return types;
 }
 
+std::map<std::string, std::function<int()>>& HeldFiles() {
+    static std::map<std::string, std::function<int()>> files;
+    return files;
+}
+
 std::vector<std::function<void(Store&)>>& BootSteps() {
     static std::vector<std::function<void(Store&)>> steps;
     return steps;
@@ -66,6 +71,16 @@ bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler) {
 bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler) {
     FileSystemTypes()[fstype] = std::move(handler);
     return true;
+}
+
+bool RegisterHeldFile(const std::string& hostPath, std::function<int()> unlink) {
+    HeldFiles()[hostPath] = std::move(unlink);
+    return true;
+}
+
+const std::function<int()>* FindHeldFile(const std::string& hostPath) {
+    const auto found = HeldFiles().find(hostPath);
+    return found == HeldFiles().end() ? nullptr : &found->second;
 }
 
 bool RegisterBootStep(std::function<void(Store&)> step) {

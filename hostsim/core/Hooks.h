@@ -30,6 +30,11 @@ struct FileSystemType {
 };
 bool RegisterFileSystemType(const std::string& fstype, FileSystemType handler);
 
+// A host file whose owner removes it only as part of its own commit, so that a removal asked for
+// ahead of a commit that then fails removes nothing. HostOs::unlink of `hostPath` calls `unlink`
+// (0 or an errno value) instead of removing the file; the owner removes it when it commits.
+bool RegisterHeldFile(const std::string& hostPath, std::function<int()> unlink);
+
 class Store;
 // What the host does as it starts again after a reboot or power-off: run in registration order,
 // inside the write transaction that records the signal to init, so a restart is all or nothing.

@@ -11,6 +11,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
+#include <filesystem>
 #include <string>
 
 #include "core/Registry.h"
@@ -237,13 +238,18 @@ int unlink(const char* path) {
         auto& store = BrixSim::Store::Get();
         const auto real = store.Resolve(path);
         if (!real) return EACCES;
+        const auto* held = BrixSim::FindHeldFile(
+            std::filesystem::path(path).lexically_normal().string());
         int error = 0;
         store.Write([&] {
-            if (::unlink(real->c_str()) != 0) {
-                error = errno;
-                return;
+            error = held ? (*held)() : ::unlink(real->c_str()) != 0 ? errno : 0;
+            if (error != 0) return;
+            // A held file is removed by its owner's next commit.
+            if (held) {
+                store.Journal("unlink", {{"path", std::string(path)}, {"held", true}});
+            } else {
+                store.Journal("unlink", {{"path", std::string(path)}});
             }
-            store.Journal("unlink", {{"path", std::string(path)}});
         });
         return error;
     });

@@ -17,6 +17,8 @@ const std::vector<TableSet>& RegisteredTables();
 std::vector<std::string> RegisteredOperations();
 const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes();
 const std::map<std::string, FileSystemType>& RegisteredFileSystemTypes();
+// The removal handler of a held file, or null.
+const std::function<int()>* FindHeldFile(const std::string& hostPath);
 // The keys of `brixsim init --scale`, by name.
 const std::map<std::string, ScaleKey>& RegisteredScaleKeys();
 // Restarts the host's running state; called inside a write transaction.

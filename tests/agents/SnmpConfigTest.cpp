@@ -362,6 +362,16 @@ TEST(SnmpConfig, BootStateIsRemovedOnlyWhenTheEngineIdChanges) {
     EXPECT_EQ(kinds,
               (std::vector<std::string>{"commit", "unlink /var/tmp/snmp_boot.txt", "commit"}));
     EXPECT_EQ(Snmp(host, {"set", "-E", "0x0102030406"}).status, 0);
+
+    // A set refused at its commit keeps the boots of the engine id that stays.
+    std::ofstream(boot) << "engineBoots 12\n";
+    const auto refused =
+        Snmp(host, {"set", "-E", "0x0102030407", "-i", "192.0.2.1/nobody/auth/trap"});
+    EXPECT_EQ(refused.status, 1) << refused.err;
+    std::ostringstream state;
+    state << std::ifstream(boot).rdbuf();
+    EXPECT_EQ(state.str(), "engineBoots 12\n");
+    EXPECT_EQ(Config(host)["engineid"], "0102030406");
 }
 
 // A set that fails on the way leaves the stored configuration as it was.

@@ -167,18 +167,18 @@ TEST(HostOs, UnlinkStaysInsideTheRoot) {
     TempHost host;
     const fs::path root = Store::Get().Root();
     fs::create_directories(root / "var/tmp");
-    std::ofstream(root / "var/tmp/snmp_boot.txt") << "engine boots 3\n";
+    std::ofstream(root / "var/tmp/old.log") << "engine boots 3\n";
     fs::create_symlink("/etc/hostname", root / "var/tmp/escape");
 
-    ASSERT_EQ(HostOs::unlink("/var/tmp/snmp_boot.txt"), 0);
-    EXPECT_FALSE(fs::exists(root / "var/tmp/snmp_boot.txt"));
+    ASSERT_EQ(HostOs::unlink("/var/tmp/old.log"), 0);
+    EXPECT_FALSE(fs::exists(root / "var/tmp/old.log"));
 
     struct Case {
         const char* path;
         int error;
     };
     const Case refused[] = {
-        {"/var/tmp/snmp_boot.txt", ENOENT}, {"/var/tmp", EISDIR}, {"/../etc/hostname", EACCES},
+        {"/var/tmp/old.log", ENOENT}, {"/var/tmp", EISDIR}, {"/../etc/hostname", EACCES},
         {"/var/tmp/escape/x", EACCES},      {"", ENOENT},
     };
     for (const auto& c : refused) {
@@ -195,7 +195,7 @@ TEST(HostOs, UnlinkStaysInsideTheRoot) {
 
     const auto journal = host.Journal();
     ASSERT_EQ(journal.size(), 2u);
-    EXPECT_EQ(journal[0], (nlohmann::json{{"kind", "unlink"}, {"path", "/var/tmp/snmp_boot.txt"}}));
+    EXPECT_EQ(journal[0], (nlohmann::json{{"kind", "unlink"}, {"path", "/var/tmp/old.log"}}));
     EXPECT_EQ(journal[1]["path"], "var/tmp/link");
 }
 

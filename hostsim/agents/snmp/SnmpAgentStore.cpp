@@ -19,6 +19,7 @@
 #include "agents/snmp/SnmpNotifier.h"
 #include "agents/snmp/SnmpSettings.h"
 #include "agents/snmp/UsmKeys.h"
+#include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SnmpAgent.h"
@@ -272,9 +273,25 @@ void ApplyChanges(const Snmp::Settings& base, const Snmp::Settings& current, Snm
     field("largestorage", base.largeStorage, current.largeStorage, next.largeStorage);
 }
 
+// The boot state belongs to the engine id: its removal, asked for before the commit that stores
+// a new id, waits for that commit, so a set that fails keeps the boots of the id that stays.
+// Within the commit the new configuration is published first: a crash between the two leaves
+// the new id with the old count, which only makes receivers learn the boots again.
+bool bootResetPending = false;
+
+int HoldBootReset() {
+    struct stat info {};
+    if (stat(HostFile(Store::Get(), kBootPath).c_str(), &info) != 0) return errno;
+    bootResetPending = true;
+    return 0;
+}
+
 class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
   public:
-    AgentConfig() { Reload(); }
+    AgentConfig() {
+        bootResetPending = false;  // a removal asked for under an earlier object lapsed with it
+        Reload();
+    }
 
     void Commit() override {
         auto& store = Begin(kCommit);
@@ -296,6 +313,8 @@ class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
         store.Write([&] {
             store.JournalCall(kCommit, std::vector<BrixSim::Value>(changes.begin(), changes.end()));
             if (staged) staged->Publish();
+            if (bootResetPending) ::unlink(HostFile(store, kBootPath).c_str());
+            bootResetPending = false;
         });
         loaded_ = current_ = next;
         reset_ = false;
@@ -598,6 +617,7 @@ const bool registered = [] {
          kGetV3Targets,    kLoad,           kGetUsers,        kSetUsers,
          kGetRemoteUsers,  kSetRemoteUsers, kGetLargeStorage, kSetLargeStorage,
          kSetV3Targets});
+    BrixSim::RegisterHeldFile(kBootPath, HoldBootReset);
     return BrixSim::RegisterTables({"snmp", "", Seed});
 }();
 
