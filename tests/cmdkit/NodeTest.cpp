@@ -75,27 +75,6 @@ TEST(Node, TreeKeepsOrderPathsAndReplacesDuplicates) {
     EXPECT_THROW(system->RegisterNamespaceNode(nullptr, "x"), CmdKit::CmdKitException);
 }
 
-TEST(Node, CommandPropertiesAndExecute) {
-    bool ran = false;
-    auto command =
-        FakeCommand::New(nullptr, nullptr, [&](CallSpec::Input&, CallSpec::Output& output) {
-            ran = true;
-            output.SetComplete();
-        });
-    EXPECT_EQ(command->GetDefaultOutputFormatter(), "simple");
-    command->SetDefaultOutputFormatter("table");
-    command->SetMetaDataField("type", "fetcher");
-    command->SetDefaultOutputParameter("wrap-last", "true");
-    EXPECT_EQ(command->GetDefaultOutputFormatter(), "table");
-    EXPECT_EQ(command->GetMetaDataField("type"), "fetcher");
-    EXPECT_EQ(command->GetMetaDataField("other"), "");
-    EXPECT_EQ(command->GetDefaultOutputParameters().at("wrap-last"), "true");
-    auto output = CallSpec::Output::New();
-    command->GetDispatcher()->Execute(CallSpec::Input::New(), output);
-    EXPECT_TRUE(ran);
-    EXPECT_TRUE(output->IsComplete());
-}
-
 TEST(Node, ResultObjects) {
     auto row = MetaObj::MetaStruct::New("Row");
     row->SetField("A", "x", MetaObj::MetaStruct::_docEmpty);

@@ -24,7 +24,9 @@ class Dorna : public testing::Test {
 TEST(DornaFeature, CommandsExistOnlyWithFeature120) {
     BrixTest::TempHost host;
     EXPECT_EQ(Coredump(host, {"dorna", "get"}).status, 2);
+    EXPECT_EQ(host.Cli({"system", "coredump", "--help"}).out.find("dorna"), std::string::npos);
     ASSERT_EQ(host.Sim({"feature", "set", "120", "on"}).status, 0);
+    EXPECT_NE(host.Cli({"system", "coredump", "--help"}).out.find("dorna"), std::string::npos);
     auto get = Coredump(host, {"dorna", "get"});
     ASSERT_EQ(get.status, 0) << get.err;
     EXPECT_EQ(json::parse(get.out), json({{"Active", kActive}, {"Configured", kActive}}));

@@ -124,34 +124,4 @@ TEST(SystemInfo, WelcomeMessageSetNeedsMessage) {
     EXPECT_EQ(host.Cli({"system", "welcomemsg", "get"}).out, "Welcome to Brix Host\n");
 }
 
-TEST(SystemInfo, HelpOfEachCommand) {
-    BrixTest::TempHost host;
-    const std::pair<std::vector<std::string>, const char*> cases[] = {
-        {{"system", "uuid", "get", "--help"}, "Get the system UUID."},
-        {{"system", "version", "get", "--help"},
-         "Display the product name, version and build information."},
-        {{"system", "boot", "device", "get", "--help"}, "Get the systems boot device."},
-        {{"system", "welcomemsg", "set", "--help"}, "Welcome Message String."},
-    };
-    for (const auto& [args, text] : cases) {
-        auto run = host.Cli(args);
-        EXPECT_EQ(run.status, 0);
-        EXPECT_NE(run.out.find(text), std::string::npos) << run.out;
-    }
-}
-
-TEST(SystemInfo, ListCommandsShowsTheQueries) {
-    BrixTest::TempHost host;
-    auto run = host.Cli({"--list-commands", "--formatter=json"});
-    ASSERT_EQ(run.status, 0) << run.err;
-    const auto listing = json::parse(run.out);
-    std::vector<std::string> paths;
-    for (const auto& row : listing) paths.push_back(row.begin()->get<std::string>());
-    for (const char* path : {"system uuid get", "system version get", "system stats installtime get",
-                             "system boot device get", "system welcomemsg get",
-                             "system welcomemsg set"}) {
-        EXPECT_NE(std::find(paths.begin(), paths.end(), path), paths.end()) << path;
-    }
-}
-
 }  // namespace

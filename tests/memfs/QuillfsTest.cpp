@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <fstream>
 #include <map>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -79,33 +80,36 @@ std::vector<json> Records(const TempHost& host, const std::string& kind) {
     return found;
 }
 
-// The output hints are not part of the generated reference.
-TEST(QuillfsCommands, DeclareTheirOutputHints) {
-    using Hints = std::map<std::string, std::string>;
-    const std::pair<std::shared_ptr<CmdKit::AutoCli::CommandSpec>, Hints> cases[] = {
-        {QuillfsGet::New(),
-         {{"fields:QuillfsStatus",
-           "Total Inodes,Used Inodes,Unlinked Inodes,Reserved Inodes,Peak Used Inodes,Peak "
-           "Unlinked Inodes,Peak Reserved Inodes,Free Inode Percent,Lowest Free Inode Percent"},
-          {"show-header:QuillfsStatus", "false"}}},
-        {QuillfsRamdiskAdd::New(false), {}},
-        {QuillfsRamdiskRemove::New(), {}},
-        {QuillfsRamdiskList::New(),
-         {{"table-columns",
-           "Ramdisk Name,System,Include in Coredumps,Reserved,Maximum,Used,Peak Used,Free,Reserved "
-           "Free,Maximum Inodes,Allocated Inodes,Used Inodes,Mount Point"},
-          {"units:QuillfsRamdisk.Reserved", "KiB"},
-          {"units:QuillfsRamdisk.Maximum", "KiB"},
-          {"units:QuillfsRamdisk.Used", "KiB"},
-          {"units:QuillfsRamdisk.Peak Used", "KiB"},
-          {"units:QuillfsRamdisk.Free", "%"},
-          {"units:QuillfsRamdisk.Reserved Free", "%"}}},
-        {QuillfsTardiskList::New(),
-         {{"table-columns", "Tardisk Name,System,Size"}, {"units:QuillfsTardisk.Size", "B"}}},
+// The output hints are not part of the generated reference: what they do shows in the default
+// output, the columns with their units and the status without a heading.
+TEST(QuillfsCommands, DefaultOutputFollowsTheirHints) {
+    TempHost host;
+    const auto firstLine = [&](std::vector<std::string> args) {
+        const auto run = host.Cli(args);
+        EXPECT_EQ(run.status, 0) << run.err;
+        return run.out.substr(0, run.out.find('\n'));
     };
-    for (const auto& [command, hints] : cases) {
-        EXPECT_EQ(command->GetDefaultOutputParameters(), hints) << command->GetDescription();
-    }
+    const auto words = [](const std::string& line) {
+        std::vector<std::string> columns;
+        std::istringstream in(line);
+        for (std::string word; in >> word;) columns.push_back(word);
+        return columns;
+    };
+    EXPECT_EQ(words(firstLine({"system", "quillfs", "ramdisk", "list"})),
+              words("Ramdisk Name  System  Include in Coredumps  Reserved (KiB)  Maximum (KiB)  "
+                    "Used (KiB)  Peak Used (KiB)  Free (%)  Reserved Free (%)  Maximum Inodes  "
+                    "Allocated Inodes  Used Inodes  Mount Point"));
+    EXPECT_EQ(words(firstLine({"system", "quillfs", "tardisk", "list"})),
+              words("Tardisk Name  System  Size (B)"));
+    const auto status = host.Cli({"system", "quillfs", "get"});
+    std::vector<std::string> labels;
+    std::istringstream lines(status.out);
+    for (std::string line; std::getline(lines, line);)
+        labels.push_back(line.substr(0, line.find(':')));
+    EXPECT_EQ(labels, (std::vector<std::string>{
+                          "Total Inodes", "Used Inodes", "Unlinked Inodes", "Reserved Inodes",
+                          "Peak Used Inodes", "Peak Unlinked Inodes", "Peak Reserved Inodes",
+                          "Free Inode Percent", "Lowest Free Inode Percent"}));
 }
 
 // Registered, the command runs switched off (its options are in the reference); switched on,

@@ -12,6 +12,7 @@ namespace {
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using BrixTest::With;
 using nlohmann::json;
 
 const std::vector<std::string> kGet = {"system", "module", "get"};
@@ -19,11 +20,6 @@ const std::vector<std::string> kList = {"system", "module", "list"};
 const std::vector<std::string> kLoad = {"system", "module", "load"};
 const std::vector<std::string> kSet = {"system", "module", "set"};
 const std::string kModuleOps = "KernCtl::System::ModuleImpl::";
-
-std::vector<std::string> With(std::vector<std::string> base, std::vector<std::string> more) {
-    base.insert(base.end(), more.begin(), more.end());
-    return base;
-}
 
 class Modules : public testing::Test {
   protected:
@@ -157,34 +153,13 @@ TEST_F(Modules, LoadDisabledModuleNeedsForce) {
                                  json::array({kModuleOps + "Load", "watchdog_hw", "", false})}));
 }
 
-struct LoadCase {
-    const char* name;
-    std::vector<std::string> args;
-    std::string message;
-};
-
-// Test output names the row instead of dumping its bytes.
-void PrintTo(const LoadCase& row, std::ostream* out) {
-    *out << row.name;
-}
-
-class ModuleLoadRefusals : public testing::TestWithParam<LoadCase> {
-  protected:
-    BrixTest::TempHost host;
-};
+class ModuleLoadRefusals : public BrixTest::RefusalTest {};
 
 TEST_P(ModuleLoadRefusals, ReportAndLoadNothing) {
-    const auto& c = GetParam();
-    const auto before = Json(host, kList).out;
-    const auto run = Json(host, With(kLoad, c.args));
-    EXPECT_EQ(run.status, 1);
-    EXPECT_EQ(run.err, c.message + "\n");
-    EXPECT_TRUE(run.out.is_null());
-    EXPECT_EQ(Json(host, kList).out, before);
-    EXPECT_TRUE(Calls(host, "KernCtl::System::ModuleImpl::Load").empty());
+    ExpectRefused(kLoad, "KernCtl::System::ModuleImpl::Load");
 }
 
-const LoadCase kLoadRefusals[] = {
+const BrixTest::Refusal kLoadRefusals[] = {
     {"EmptyName", {"-m", ""}, "Module name cannot be empty."},
     {"EmptyNameForced", {"-m", "", "-f"}, "Module name cannot be empty."},
     {"Unknown", {"-m", "warp_drive"}, "unknown module 'warp_drive'"},
@@ -201,9 +176,7 @@ const LoadCase kLoadRefusals[] = {
 };
 
 INSTANTIATE_TEST_SUITE_P(Messages, ModuleLoadRefusals, testing::ValuesIn(kLoadRefusals),
-                         [](const testing::TestParamInfo<LoadCase>& info) {
-                             return info.param.name;
-                         });
+                         BrixTest::RefusalName);
 
 TEST_F(Modules, LoadMeetsRequirementsOnceProvided) {
     ASSERT_EQ(Json(host, With(kLoad, {"-m", "qln_nic25g"})).status, 0);

@@ -67,32 +67,6 @@ json Stats(int64_t running, int64_t count, int64_t l1, int64_t l5, int64_t l15) 
                {"load15", l15}}}}};
 }
 
-TEST(ProcessCommands, DeclareTheirDescriptionsFormattersAndKinds) {
-    struct Case {
-        std::shared_ptr<CmdKit::AutoCli::CommandSpec> command;
-        const char* description;
-        const char* formatter;
-    };
-    using namespace OstrelCli::System;
-    const Case cases[] = {
-        {ProcessList::New(), "List the Brixkernel UserWorld processes currently on the host.",
-         "table"},
-        {ProcessStatsLoadGet::New(), "System load average over the last 1, 5 and 15 minutes.",
-         "simple"},
-        {ProcessStatsRunningGet::New(), "Number of currently running processes.", "simple"},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.description);
-        EXPECT_EQ(c.command->GetDescription(), c.description);
-        EXPECT_EQ(c.command->GetDefaultOutputFormatter(), c.formatter);
-        EXPECT_EQ(c.command->GetMetaDataField("type"), "fetcher");
-        EXPECT_TRUE(c.command->GetInputSpec()->GetParameters().empty());
-    }
-    const auto hints = ProcessList::New()->GetDefaultOutputParameters();
-    ASSERT_EQ(hints.size(), 1u);
-    EXPECT_EQ(hints.at("fields:UserWorld"), "Id,Cartel Id,Name,Security Domain,Command Line");
-}
-
 TEST(ProcessList, JsonHasEveryFieldOfEveryWorldInOrder) {
     TempHost host;
     const auto run = host.Cli({"--formatter=json", "system", "process", "list"});

@@ -13,15 +13,11 @@ namespace {
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using BrixTest::With;
 using nlohmann::json;
 
 const std::vector<std::string> kList = {"system", "settings", "advanced", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "advanced", "set"};
-
-std::vector<std::string> With(std::vector<std::string> base, std::vector<std::string> more) {
-    base.insert(base.end(), more.begin(), more.end());
-    return base;
-}
 
 class AdvancedOptions : public testing::Test {
   protected:
@@ -136,36 +132,13 @@ TEST_F(AdvancedOptions, SingleOptionIgnoresDeltaAndTree) {
     EXPECT_TRUE(unknown.out.is_null());
 }
 
-struct SetCase {
-    const char* name;
-    std::vector<std::string> args;
-    std::string message;
-    const char* fault = nullptr;  // an operation made to fail with "commit refused"
-};
-
-// Test output names the row instead of dumping its bytes.
-void PrintTo(const SetCase& row, std::ostream* out) {
-    *out << row.name;
-}
-
-class AdvancedSetRefusals : public testing::TestWithParam<SetCase> {
-  protected:
-    BrixTest::TempHost host;
-};
+class AdvancedSetRefusals : public BrixTest::RefusalTest {};
 
 TEST_P(AdvancedSetRefusals, ReportsAndChangesNothing) {
-    const auto& c = GetParam();
-    const auto before = Json(host, kList).out;
-    if (c.fault) host.Fault(c.fault, "commit refused");
-    const auto run = Json(host, With(kSet, c.args));
-    EXPECT_EQ(run.status, 1);
-    EXPECT_EQ(run.err, c.message + "\n");
-    EXPECT_TRUE(run.out.is_null());
-    EXPECT_EQ(Json(host, kList).out, before);
-    EXPECT_TRUE(Calls(host, "KernCtl::Adv::").empty());
+    ExpectRefused(kSet, "KernCtl::Adv::");
 }
 
-const SetCase kRefusals[] = {
+const BrixTest::Refusal kRefusals[] = {
     {"NoValue",
      {"-o", "/Cpu/SchedQuantumUs"},
      "must specify exactly one of: int-value, string-value, default"},
@@ -227,9 +200,7 @@ const SetCase kRefusals[] = {
 };
 
 INSTANTIATE_TEST_SUITE_P(Messages, AdvancedSetRefusals, testing::ValuesIn(kRefusals),
-                         [](const testing::TestParamInfo<SetCase>& info) {
-                             return info.param.name;
-                         });
+                         BrixTest::RefusalName);
 
 TEST_F(AdvancedOptions, SetValuesAndResetCommitInOrder) {
     auto run = Json(host, With(kSet, {"-o", "/Cpu/HaltIdleThresholdUs", "-i", "4294967294"}));

@@ -16,15 +16,11 @@ namespace {
 using BrixTest::Calls;
 using BrixTest::Column;
 using BrixTest::Json;
+using BrixTest::With;
 using nlohmann::json;
 
 const std::vector<std::string> kList = {"system", "settings", "kernel", "list"};
 const std::vector<std::string> kSet = {"system", "settings", "kernel", "set"};
-
-std::vector<std::string> With(std::vector<std::string> base, std::vector<std::string> more) {
-    base.insert(base.end(), more.begin(), more.end());
-    return base;
-}
 
 class KernelSettings : public testing::Test {
   protected:
@@ -99,34 +95,13 @@ TEST_F(KernelSettings, SetChangesTheConfiguredValueOnly) {
                            {"KernCtl::System::KernelOpts::SetOption", "enableLargeBar", "FALSE"}}));
 }
 
-struct Refusal {
-    const char* name;
-    std::vector<std::string> args;
-    std::string message;
-};
-
-// Test output names the row instead of dumping its bytes.
-void PrintTo(const Refusal& row, std::ostream* out) {
-    *out << row.name;
-}
-
-class KernelSettingRefusals : public testing::TestWithParam<Refusal> {
-  protected:
-    BrixTest::TempHost host;
-};
+class KernelSettingRefusals : public BrixTest::RefusalTest {};
 
 TEST_P(KernelSettingRefusals, ReportAndKeepTheValue) {
-    const auto& c = GetParam();
-    const auto before = Json(host, kList).out;
-    const auto run = Json(host, With(kSet, c.args));
-    EXPECT_EQ(run.status, 1);
-    EXPECT_EQ(run.err, c.message + "\n");
-    EXPECT_TRUE(run.out.is_null());
-    EXPECT_EQ(Json(host, kList).out, before);
-    EXPECT_TRUE(Calls(host, "KernCtl::System::KernelOpts::").empty());
+    ExpectRefused(kSet, "KernCtl::System::KernelOpts::");
 }
 
-const Refusal kRefusals[] = {
+const BrixTest::Refusal kRefusals[] = {
     {"UnknownSetting", {"-s", "warpDrive", "-v", "1"}, "Unknown kernel setting 'warpDrive'"},
     {"BoolWord",
      {"-s", "skipPciReset", "-v", "yes"},
@@ -152,9 +127,7 @@ const Refusal kRefusals[] = {
 };
 
 INSTANTIATE_TEST_SUITE_P(Values, KernelSettingRefusals, testing::ValuesIn(kRefusals),
-                         [](const testing::TestParamInfo<Refusal>& info) {
-                             return info.param.name;
-                         });
+                         BrixTest::RefusalName);
 
 TEST_F(KernelSettings, BoundaryValuesAreAccepted) {
     for (const auto& [setting, value] : std::vector<std::pair<std::string, std::string>>{
