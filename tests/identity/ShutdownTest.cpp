@@ -88,6 +88,13 @@ TEST(Shutdown, RefusalsInOrder) {
                   "System is not in maintenance mode. Cannot perform requested operation.");
     ExpectRefused(host.Cli({"system", "shutdown", "poweroff", "-r", "x", "-d", "10"}),
                   "System is not in maintenance mode. Cannot perform requested operation.");
+    // Only "in maintenance mode" lets a shutdown through, never an unknown state.
+    for (int state : {0, 7}) {
+        BrixSim::Store::Get().Prepare("UPDATE maintenance_mode SET state = ?").Bind(1, state).Run();
+        ExpectRefused(host.Cli({"system", "shutdown", "poweroff", "-r", "x"}),
+                      "System is not in maintenance mode. Cannot perform requested operation.");
+    }
+    BrixSim::Store::Get().Prepare("UPDATE maintenance_mode SET state = 2").Run();
 
     // The reason's length is checked before the state is read: 513 characters are refused even
     // when the state cannot be read, 512 reach the state.
