@@ -89,6 +89,10 @@ TEST(SnmpHash, ChecksInOrder) {
         {{},
          {"-r", "-A", "maplesyrup"},
          "Must specify set authentication protocol via set --authentication"},
+        // The authentication protocol is asked for first, also when privacy lacks one too.
+        {{},
+         {"-r", "-A", "maplesyrup", "-X", "maplesyrup"},
+         "Must specify set authentication protocol via set --authentication"},
         {{"-a", "MD5"},
          {"-r", "-A", "maplesyrup", "-X", "maplesyrup"},
          "Must first set privacy protocol via set --privacy"},
