@@ -44,9 +44,13 @@ TEST(Hostname, SetChangesAndSavesOnce) {
          Names("x1", "rack4.dc.example", "x1.rack4.dc.example"),
          {"defaultTcpipStack", "x1", "rack4.dc.example"}},
         {{"-f", "solo"}, Names("solo", "", "solo"), {"defaultTcpipStack", "solo", ""}},
+        // The longest label there may be.
+        {{"-H", std::string(63, 'h')},
+         Names(std::string(63, 'h'), "lab.example.net", std::string(63, 'h') + ".lab.example.net"),
+         {"defaultTcpipStack", std::string(63, 'h'), "lab.example.net"}},
     };
     for (const auto& change : cases) {
-        SCOPED_TRACE(change.options[1]);
+        SCOPED_TRACE(change.options[1].substr(0, 20));
         BrixTest::TempHost host;
         JournalMark mark(host);
         std::vector<std::string> words{"system", "hostname", "set"};
