@@ -8,6 +8,8 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <cstring>
+#include <fstream>
 #include <memory>
 #include <mutex>
 #include <nlohmann/json.hpp>
@@ -16,6 +18,7 @@
 #include <thread>
 #include <utility>
 
+#include "core/DurableWrite.h"
 #include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
 
@@ -39,6 +42,30 @@ constexpr const char* kCoreSchema =
     "CREATE TABLE IF NOT EXISTS meta (key TEXT PRIMARY KEY, value TEXT NOT NULL);";
 
 constexpr const char* kSchemaVersion = "1";
+
+// The store's own files: the database, its write-ahead log and the log's index.
+constexpr const char* kStoreFiles[] = {"host.db", "host.db-wal", "host.db-shm", "host.db-journal"};
+constexpr const char* kMarkerFormat = "brixhost 1";
+
+// SQLite's last error on `db`, as a StoreError naming the database file; `context` (a statement)
+// is added when given.
+[[noreturn]] void ThrowStoreError(sqlite3* db, std::string_view context = {}) {
+    const int code = db ? sqlite3_extended_errcode(db) : SQLITE_NOMEM;
+    const char* file = db ? sqlite3_db_filename(db, "main") : nullptr;
+    std::string message = "host store";
+    if (file && *file) message += std::string(" ") + file;
+    message += ": ";
+    message += db ? sqlite3_errmsg(db) : "out of memory";
+    const int primary = code & 0xff;
+    if (db &&
+        (primary == SQLITE_IOERR || primary == SQLITE_CANTOPEN || primary == SQLITE_FULL ||
+         primary == SQLITE_READONLY) &&
+        sqlite3_system_errno(db) != 0) {
+        message += std::string(" (") + std::strerror(sqlite3_system_errno(db)) + ")";
+    }
+    if (!context.empty()) message += " in \"" + std::string(context) + "\"";
+    throw StoreError(message, code);
+}
 
 std::unique_ptr<Store>& Instance() {
     static std::unique_ptr<Store> instance;
@@ -97,9 +124,8 @@ void ExecRaw(sqlite3* db, std::string_view sql) {
     char* error = nullptr;
     const std::string text(sql);
     if (sqlite3_exec(db, text.c_str(), nullptr, nullptr, &error) != SQLITE_OK) {
-        std::string message = error ? error : sqlite3_errmsg(db);
         sqlite3_free(error);
-        throw std::runtime_error("host store: " + message);
+        ThrowStoreError(db);
     }
 }
 
@@ -128,13 +154,12 @@ void DecrementFault(Store& store, const std::string& operation) {
 // Stmt
 
 Stmt::Stmt(sqlite3* db, std::string_view sql) : db_(db) {
-    if (!db_) throw std::runtime_error("host store: not open");
+    if (!db_) throw StoreError("host store: not open", 0);
     if (sqlite3_prepare_v2(db_, sql.data(), static_cast<int>(sql.size()), &stmt_, nullptr) !=
         SQLITE_OK) {
-        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)) + " in \"" +
-                                 std::string(sql) + "\"");
+        ThrowStoreError(db_, sql);
     }
-    if (!stmt_) throw std::runtime_error("host store: empty statement");
+    if (!stmt_) throw StoreError("host store: empty statement", 0);
 }
 
 Stmt::~Stmt() {
@@ -156,21 +181,21 @@ Stmt& Stmt::Bind(int index, std::string_view text) {
     const char* data = text.data() ? text.data() : "";
     if (sqlite3_bind_text(stmt_, index, data, static_cast<int>(text.size()), SQLITE_TRANSIENT) !=
         SQLITE_OK) {
-        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+        ThrowStoreError(db_);
     }
     return *this;
 }
 
 Stmt& Stmt::Bind(int index, int64_t value) {
     if (sqlite3_bind_int64(stmt_, index, value) != SQLITE_OK) {
-        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+        ThrowStoreError(db_);
     }
     return *this;
 }
 
 Stmt& Stmt::BindNull(int index) {
     if (sqlite3_bind_null(stmt_, index) != SQLITE_OK) {
-        throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)));
+        ThrowStoreError(db_);
     }
     return *this;
 }
@@ -179,9 +204,9 @@ bool Stmt::Step() {
     const int rc = sqlite3_step(stmt_);
     if (rc == SQLITE_ROW) return true;
     if (rc == SQLITE_DONE) return false;
-    const std::string message = sqlite3_errmsg(db_);
+    // The step's own error; reset reports it again and keeps it as the connection's.
     sqlite3_reset(stmt_);
-    throw std::runtime_error("host store: " + message);
+    ThrowStoreError(db_);
 }
 
 void Stmt::Run() {
@@ -244,7 +269,7 @@ fs::path Store::DefaultRoot() {
     } else if (const char* home = getenv("HOME"); home && *home) {
         state = fs::path(home) / ".local" / "state";
     } else {
-        throw std::runtime_error("host store: neither BRIX_HOST_ROOT nor HOME is set");
+        throw StoreError("host store: neither BRIX_HOST_ROOT nor HOME is set", 0);
     }
     return (fs::absolute(state) / "brixsim" / "default").lexically_normal();
 }
@@ -260,17 +285,16 @@ Stmt Store::Prepare(std::string_view sql) {
     // Enough for every fixed statement of the simulator; statements built from data beyond it
     // are not kept.
     constexpr size_t kMaxCached = 512;
-    if (!db_) throw std::runtime_error("host store: not open");
+    if (!db_) throw StoreError("host store: not open", 0);
     auto found = statements_.find(std::string(sql));
     if (found == statements_.end()) {
         if (statements_.size() >= kMaxCached) return Stmt(db_, sql);
         sqlite3_stmt* stmt = nullptr;
         if (sqlite3_prepare_v3(db_, sql.data(), static_cast<int>(sql.size()),
                                SQLITE_PREPARE_PERSISTENT, &stmt, nullptr) != SQLITE_OK) {
-            throw std::runtime_error("host store: " + std::string(sqlite3_errmsg(db_)) + " in \"" +
-                                     std::string(sql) + "\"");
+            ThrowStoreError(db_, sql);
         }
-        if (!stmt) throw std::runtime_error("host store: empty statement");
+        if (!stmt) throw StoreError("host store: empty statement", 0);
         found = statements_.emplace(std::string(sql), CachedStmt{stmt, false}).first;
     }
     if (found->second.inUse) return Stmt(db_, sql);
@@ -307,41 +331,143 @@ void Store::Read(const std::function<void()>& work) {
     Exec("COMMIT");
 }
 
-void Store::Open() {
+namespace {
+bool& AdoptingFolderFlag() {
+    static bool adopting = false;
+    return adopting;
+}
+}  // namespace
+
+bool Store::AdoptingFolder() {
+    return AdoptingFolderFlag();
+}
+
+void Store::AdoptFolder() {
+    AdoptingFolderFlag() = true;
+}
+
+std::optional<std::vector<std::string>> Store::HostEntries(const fs::path& root) {
+    std::ifstream marker(root / kMarkerName);
+    std::string line;
+    std::vector<std::string> entries(std::begin(kStoreFiles), std::end(kStoreFiles));
+    entries.emplace_back(kMarkerName);
+    if (marker && std::getline(marker, line) && line == kMarkerFormat) {
+        while (std::getline(marker, line)) {
+            if (!line.empty() && line.find('/') == std::string::npos && line != "." && line != "..")
+                entries.push_back(line);
+        }
+        return entries;
+    }
     std::error_code ec;
+    if (fs::exists(root / "host.db", ec)) return entries;
+    return std::nullopt;
+}
+
+void Store::Open() {
+    if (root_.empty() || root_ == root_.root_path()) {
+        throw StoreError(
+            "host store: " + root_.string() + " cannot be a host root: name a folder of its own",
+            0);
+    }
+    const fs::path file = root_ / "host.db";
+    std::error_code ec;
+    const bool marked = fs::exists(root_ / kMarkerName, ec);
+    if (marked) {
+        // A complete host was here: its store must hold it. Nothing but brixsim init makes a
+        // host over a lost one.
+        const auto size = fs::file_size(file, ec);
+        if (ec || size == 0) {
+            throw StoreError("host store " + file.string() + ": " +
+                                 (ec ? "the store is missing" : "the store is empty") +
+                                 "; the host's state is lost (brixsim init --force makes a new "
+                                 "host)",
+                             0);
+        }
+    } else if (fs::exists(root_, ec) && !AdoptingFolder()) {
+        // A new host is made only in an empty folder. An unmarked store that holds something is
+        // a host being made by another process, or one of an earlier version: taken as it is.
+        bool foreign = false;
+        for (fs::directory_iterator it(root_, ec), end; !ec && it != end; it.increment(ec)) {
+            const std::string name = it->path().filename().string();
+            foreign |= std::find(std::begin(kStoreFiles), std::end(kStoreFiles), name) ==
+                       std::end(kStoreFiles);
+        }
+        if (ec) {
+            throw StoreError("host store: cannot read " + root_.string() + ": " + ec.message(), 0);
+        }
+        std::error_code sizeError;
+        const bool storeHoldsSomething = fs::file_size(file, sizeError) > 0 && !sizeError;
+        if (foreign && !storeHoldsSomething) {
+            throw StoreError("host store: " + root_.string() +
+                                 " holds files but no host; a host is made only in an empty or "
+                                 "new folder",
+                             0);
+        }
+    }
+    // What a folder holds before the host is made is not the host's.
+    std::set<std::string> before;
+    if (!marked) {
+        for (fs::directory_iterator it(root_, ec), end; !ec && it != end; it.increment(ec)) {
+            before.insert(it->path().filename().string());
+        }
+        ec.clear();
+    }
     fs::create_directories(root_, ec);
     if (ec) {
-        throw std::runtime_error("host store: cannot create host root " + root_.string() + ": " +
-                                 ec.message());
+        throw StoreError(
+            "host store: cannot create host root " + root_.string() + ": " + ec.message(), 0);
     }
     root_ = fs::canonical(root_, ec);
-    if (ec) throw std::runtime_error("host store: " + ec.message());
+    if (ec) throw StoreError("host store: " + root_.string() + ": " + ec.message(), 0);
 
-    const fs::path file = root_ / "host.db";
-    if (sqlite3_open_v2(file.c_str(), &db_, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, nullptr) !=
-        SQLITE_OK) {
-        const std::string message = db_ ? sqlite3_errmsg(db_) : "out of memory";
+    const int flags = SQLITE_OPEN_READWRITE | (marked ? 0 : SQLITE_OPEN_CREATE);
+    if (sqlite3_open_v2((root_ / "host.db").c_str(), &db_, flags, nullptr) != SQLITE_OK) {
+        if (!db_) throw StoreError("host store " + file.string() + ": out of memory", SQLITE_NOMEM);
+        try {
+            ThrowStoreError(db_);
+        } catch (...) {
+            sqlite3_close_v2(db_);
+            db_ = nullptr;
+            throw;
+        }
+    }
+    sqlite3_extended_result_codes(db_, 1);
+    sqlite3_busy_timeout(db_, kBusyTimeoutMs);
+    try {
+        SwitchToWal();
+    } catch (const StoreError& error) {
+        // A host on a folder this process cannot write: read it as it stands, when its log
+        // holds nothing that only a writer could apply. Any change is then refused by SQLite.
+        const int primary = error.Code() & 0xff;
+        std::error_code walError;
+        const auto walSize = fs::file_size(root_ / "host.db-wal", walError);
+        if (!marked || (primary != SQLITE_READONLY && primary != SQLITE_CANTOPEN) ||
+            (!walError && walSize > 0)) {
+            throw;
+        }
         sqlite3_close_v2(db_);
         db_ = nullptr;
-        throw std::runtime_error("host store: cannot open " + file.string() + ": " + message);
-    }
-    sqlite3_busy_timeout(db_, kBusyTimeoutMs);
-    // Switching a new database to WAL needs a moment alone with it; another process creating
-    // the same root at once can make this fail briefly.
-    for (int attempt = 0;; ++attempt) {
-        try {
-            Stmt mode(db_, "PRAGMA journal_mode=WAL");
-            if (mode.Step() && mode.Text(0) == "wal") break;
-        } catch (const std::runtime_error&) {
-            if (attempt >= 200) throw;
+        const std::string uri = "file:" + (root_ / "host.db").string() + "?immutable=1";
+        if (sqlite3_open_v2(uri.c_str(), &db_, SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr) !=
+            SQLITE_OK) {
+            ThrowStoreError(db_);
         }
-        if (attempt >= 200) throw std::runtime_error("host store: cannot switch to WAL mode");
-        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        readOnly_ = true;
+    }
+    if (marked) {
+        Stmt meta(db_, "SELECT 1 FROM sqlite_master WHERE type = 'table' AND name = 'meta'");
+        if (!meta.Step()) {
+            throw StoreError("host store " + file.string() +
+                                 ": the store holds no host; the host's state is lost (brixsim "
+                                 "init --force makes a new host)",
+                             0);
+        }
     }
     // The WAL and its index stay when the last connection closes: the next process opens them
     // instead of creating, sizing and deleting them again. The size limit makes that close
     // truncate the checkpointed WAL to nothing; otherwise its old frames stay valid and every
     // later process would read and copy all of them back again, a cost growing with the host.
+    if (readOnly_) return;
     int persistWal = 1;
     sqlite3_file_control(db_, "main", SQLITE_FCNTL_PERSIST_WAL, &persistWal);
     Exec("PRAGMA journal_size_limit=1048576");
@@ -349,6 +475,58 @@ void Store::Open() {
     Exec("PRAGMA synchronous=FULL");
     Exec("PRAGMA foreign_keys=ON");
     CreateSchema(true);
+    if (!marked) WriteMarker(before);
+}
+
+// Switching a new database to WAL needs a moment alone with it: another process creating the
+// same root at once makes it busy for a while, which is waited out. Any other failure (not a
+// database, read-only, disk full) is final and reported at once.
+void Store::SwitchToWal() {
+    constexpr int kAttempts = 200;
+    for (int attempt = 0;; ++attempt) {
+        sqlite3_stmt* mode = nullptr;
+        int rc = sqlite3_prepare_v2(db_, "PRAGMA journal_mode=WAL", -1, &mode, nullptr);
+        if (rc == SQLITE_OK) {
+            rc = sqlite3_step(mode);
+            const bool wal = rc == SQLITE_ROW && std::string_view(reinterpret_cast<const char*>(
+                                                     sqlite3_column_text(mode, 0))) == "wal";
+            sqlite3_finalize(mode);
+            if (wal) return;
+            rc = sqlite3_extended_errcode(db_);
+        }
+        const int primary = rc & 0xff;
+        if ((primary != SQLITE_BUSY && primary != SQLITE_LOCKED) || attempt >= kAttempts) {
+            if (primary == SQLITE_OK || primary == SQLITE_ROW || primary == SQLITE_DONE) {
+                throw StoreError("host store " + (root_ / "host.db").string() +
+                                     ": cannot switch to write-ahead logging",
+                                 rc);
+            }
+            ThrowStoreError(db_);
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    }
+}
+
+// The marker names the top-level entries the new host made, so that `brixsim init --force`
+// removes those and nothing else. Written whole or not at all.
+void Store::WriteMarker(const std::set<std::string>& foreign) {
+    std::string text = std::string(kMarkerFormat) + "\n";
+    std::vector<std::string> names;
+    std::error_code ec;
+    for (fs::directory_iterator it(root_, ec), end; !ec && it != end; it.increment(ec)) {
+        const std::string name = it->path().filename().string();
+        if (name == kMarkerName || name.rfind(std::string(kMarkerName) + ".", 0) == 0) continue;
+        if (foreign.count(name) != 0 && std::find(std::begin(kStoreFiles), std::end(kStoreFiles),
+                                                  name) == std::end(kStoreFiles))
+            continue;
+        if (std::find(std::begin(kStoreFiles), std::end(kStoreFiles), name) !=
+            std::end(kStoreFiles))
+            continue;
+        names.push_back(name);
+    }
+    std::sort(names.begin(), names.end());
+    for (const auto& name : names) text += name + "\n";
+    WriteDurably(root_ / kMarkerName, text, 0644);
 }
 
 void Store::CreateSchema(bool seed) {

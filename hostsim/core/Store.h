@@ -8,6 +8,7 @@
 #include <initializer_list>
 #include <optional>
 #include <set>
+#include <stdexcept>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -24,6 +25,17 @@ namespace BrixSim {
 // A journal or call argument.
 using Value = std::variant<std::nullptr_t, bool, int64_t, std::string, std::vector<std::string>>;
 using Fields = std::vector<std::pair<std::string, Value>>;
+
+// A failure of the store itself. The message names the store's file and what is wrong with it;
+// `Code()` is SQLite's extended result code (0 when the failure is not SQLite's).
+class StoreError : public std::runtime_error {
+  public:
+    StoreError(const std::string& message, int code) : std::runtime_error(message), code_(code) {}
+    int Code() const { return code_; }
+
+  private:
+    int code_;
+};
 
 // A prepared statement; bind with 1-based indexes, step, read columns.
 class Stmt {
@@ -82,12 +94,23 @@ bool RegisterOperations(std::initializer_list<const char*> operations);
 class Store {
   public:
     // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
-    // first use; a missing root is created and seeded.
+    // first use. A missing or empty root is made a host: created, seeded and marked. A marked
+    // root whose store is missing, empty or damaged, and a folder that holds anything but a
+    // host, are refused with a StoreError that says so.
     static Store& Get();
     // Closes the process-wide store so the next Get() opens the root named by the environment.
     static void Close();
     // The host root as the environment names it (without opening anything).
     static std::filesystem::path DefaultRoot();
+    // The file that marks a folder as a complete host, and the top-level entries the host made.
+    static constexpr const char* kMarkerName = ".brixhost";
+    // The entries of `root` the host made (the store's files, the marker and what the marker
+    // lists), or nullopt when `root` holds no host.
+    static std::optional<std::vector<std::string>> HostEntries(const std::filesystem::path& root);
+    // Lets this process make a host in a folder that also holds files the host did not make:
+    // what `brixsim init --force` leaves of a former host.
+    static void AdoptFolder();
+    static bool AdoptingFolder();
 
     const std::filesystem::path& Root() const { return root_; }
     sqlite3* Db() const { return db_; }
@@ -134,7 +157,9 @@ class Store {
   private:
     explicit Store(std::filesystem::path root);
     void Open();
+    void SwitchToWal();
     void CreateSchema(bool seed);
+    void WriteMarker(const std::set<std::string>& foreign);
 
     struct CachedStmt {
         sqlite3_stmt* stmt = nullptr;
@@ -143,6 +168,7 @@ class Store {
 
     std::filesystem::path root_;
     sqlite3* db_ = nullptr;
+    bool readOnly_ = false;  // a host on a folder this process cannot write
     int writeDepth_ = 0;
     int readDepth_ = 0;
     uint64_t readSnapshot_ = 0;

@@ -29,10 +29,52 @@ TEST(Brixsim, InitRefusesAnExistingHostUnlessForced) {
 
     ASSERT_EQ(host.Sim({"--root", root.string(), "feature", "set", "7", "on"}).status, 0);
     fs::create_directories(root / "leftover/dir");
+    fs::remove(root / "etc/ostrel/snmp.xml");
     auto forced = host.Sim({"--root", root.string(), "init", "--force"});
     ASSERT_EQ(forced.status, 0) << forced.err;
-    EXPECT_FALSE(fs::exists(root / "leftover"));
+    // What the host made is made afresh; what it did not make stays, and stays the user's.
+    EXPECT_TRUE(fs::exists(root / "etc/ostrel/snmp.xml"));
+    EXPECT_TRUE(fs::exists(root / "leftover/dir"));
     EXPECT_EQ(host.Sim({"--root", root.string(), "feature", "get", "7"}).out, "off\n");
+    fs::remove_all(root / "leftover");
+    ASSERT_EQ(host.Sim({"--root", root.string(), "init", "--force"}).status, 0);
+    EXPECT_FALSE(fs::exists(root / "leftover"));
+}
+
+// brixsim makes a host only where it cannot destroy anything: never in /, never in a folder
+// of someone else's files, and an empty --root is no folder at all.
+TEST(Brixsim, RefusesFoldersThatAreNotHosts) {
+    TempHost host;
+    const fs::path mine = host.Root() / "mine";
+    fs::create_directories(mine);
+    std::ofstream(mine / "notes.txt") << "keep";
+    struct Case {
+        std::vector<std::string> args;
+        int status;
+        std::string err;  // its first line
+    };
+    const Case cases[] = {
+        {{"--root", mine.string(), "init"},
+         1,
+         "brixsim: host store: " + mine.string() +
+             " holds files but no host; a host is made only in an empty or new folder"},
+        {{"--root", mine.string(), "init", "--force"},
+         1,
+         "brixsim: host store: " + mine.string() +
+             " holds files but no host; a host is made only in an empty or new folder"},
+        {{"--root", "/", "init"},
+         1,
+         "brixsim: host store: / cannot be a host root: name a folder of its own"},
+        {{"--root", "", "init"}, 2, "brixsim: --root needs a folder"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.args[1]);
+        const auto run = host.Sim(c.args);
+        EXPECT_EQ(run.status, c.status);
+        EXPECT_EQ(run.err.substr(0, run.err.find('\n')), c.err);
+    }
+    EXPECT_EQ(std::vector<fs::path>(fs::directory_iterator(mine), fs::directory_iterator()),
+              std::vector<fs::path>{mine / "notes.txt"});
 }
 
 TEST(Brixsim, FaultsAreArmedCountedAndCleared) {

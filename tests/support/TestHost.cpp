@@ -56,7 +56,9 @@ TempHost::TempHost() {
     Remember("BRIXSIM_SLEEP_SCALE", oldScale_, hadScale_);
     setenv("BRIX_HOST_ROOT", root_.c_str(), 1);
     setenv("BRIXSIM_SLEEP_SCALE", "0", 1);
+    // Made now, so a test may put files into the root before its first command.
     BrixSim::Store::Close();
+    BrixSim::Store::Get();
 }
 
 TempHost::~TempHost() {

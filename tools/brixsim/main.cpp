@@ -129,7 +129,7 @@ int Init(const Args& args) {
         } else if (args[i] == "--scale") {
             if (i + 1 >= args.size()) throw UsageError("init: --scale needs KEY=N,...");
             scale = ParseScale(args[++i]);
-        } else if (args[i] == "--root" && i + 1 < args.size()) {
+        } else if (args[i] == "--root" && i + 1 < args.size() && !args[i + 1].empty()) {
             setenv("BRIX_HOST_ROOT", args[++i].c_str(), 1);
         } else {
             throw UsageError("init: unexpected argument " + args[i]);
@@ -137,13 +137,15 @@ int Init(const Args& args) {
     }
     BrixSim::Store::Close();
     const fs::path root = BrixSim::Store::DefaultRoot();
-    if (fs::exists(root / "host.db")) {
+    if (const auto entries = BrixSim::Store::HostEntries(root)) {
         if (!force) {
             std::cerr << "brixsim: a host already exists at " << root.string()
                       << "; use init --force to recreate it\n";
             return 1;
         }
-        for (const auto& entry : fs::directory_iterator(root)) fs::remove_all(entry.path());
+        // What the host made goes; anything else in the folder stays where it is.
+        for (const auto& name : *entries) fs::remove_all(root / name);
+        BrixSim::Store::AdoptFolder();
     }
     BrixSim::Store& store = BrixSim::Store::Get();
     if (!scale.empty()) {
@@ -318,7 +320,7 @@ int Feature(const Args& args) {
 
 int Main(Args args) {
     while (!args.empty() && args[0] == "--root") {
-        if (args.size() < 2) throw UsageError("--root needs a folder");
+        if (args.size() < 2 || args[1].empty()) throw UsageError("--root needs a folder");
         setenv("BRIX_HOST_ROOT", args[1].c_str(), 1);
         args.erase(args.begin(), args.begin() + 2);
     }
