@@ -76,6 +76,7 @@ INSTANTIATE_TEST_SUITE_P(
         Refusal{With({"--foo=bar"}), "Error: Unknown option --foo"},
         Refusal{With({"-z"}), "Error: Unknown option -z"},
         Refusal{With({"stray"}), "Error: Unexpected argument stray"},
+        Refusal{With({"-"}), "Error: Unexpected argument -"},
         Refusal{With({"--name", "a", "--name", "b"}), "Error: Option --name given more than once"},
         Refusal{With({"-n", "a", "--name=b"}), "Error: Option --name given more than once"},
         Refusal{With({"--force", "--force"}), "Error: Option --force given more than once"},
@@ -99,6 +100,8 @@ INSTANTIATE_TEST_SUITE_P(
                 "integer range"},
         Refusal{With({"--count", "99999999999999999999x"}),
                 "Error: Invalid value for --count: 99999999999999999999x is not an integer"},
+        // The type is checked before the range.
+        Refusal{With({"--port", "80x"}), "Error: Invalid value for --port: 80x is not an integer"},
         Refusal{With({"--port", "0"}),
                 "Error: Invalid value for --port: 0 is not in the range 1..65525"},
         Refusal{With({"--port", "65526"}),

@@ -5,6 +5,8 @@
 #include <string>
 #include <vector>
 
+#include "hostctl/HostCtlException.h"
+#include "kernctl/Module.h"
 #include "support/CliJson.h"
 
 namespace {
@@ -130,6 +132,17 @@ TEST_F(Modules, GetUnknownModule) {
         EXPECT_EQ(run.status, 1);
         EXPECT_EQ(run.err, "unknown module '" + name + "'\n");
         EXPECT_TRUE(run.out.is_null());
+    }
+}
+
+// The platform keeps the rule too, for any caller that asks it directly.
+TEST_F(Modules, PlatformRefusesADisabledModuleWithoutForce) {
+    KernCtl::System::ModuleImpl module("hvs_nvme_tcp");
+    try {
+        module.Load("", false);
+        FAIL() << "loaded";
+    } catch (const HostCtl::Lib::HostCtlException& error) {
+        EXPECT_STREQ(error.what(), "Module 'hvs_nvme_tcp' is disabled");
     }
 }
 
