@@ -7,19 +7,42 @@
 #include <filesystem>
 #include <string_view>
 
+#include "core/Fd.h"
+
 namespace BrixSim {
 
 enum class Publish {
     Replace,  // the file takes the place of whatever `target` was (rename)
-    Create,   // `target` must not exist yet (link); EEXIST otherwise
+    Create,   // `target` must not exist yet (link): EEXIST otherwise
 };
 
-// Writes `content` to a new temporary file beside `target` (an unpredictable name, created
-// exclusively and without following links), gives it `mode`, syncs it, publishes it under
-// `target` and syncs the folder. A `size` beyond the content leaves the rest as a hole (sparse
-// files). On any failure the temporary file is removed, `target` is as it was, and a
-// std::system_error names the step and the path.
+// A new version of `target`, written in full to a temporary file beside it: an unpredictable
+// name, created exclusively (a planted link is never followed), given `mode` and synced. A
+// `size` beyond the content leaves the rest a hole (sparse files). Publish() puts it in place
+// and syncs the folder; dropped unpublished, the temporary file is removed. Failures throw a
+// std::system_error that names the step and the path; `target` is then as it was.
+class StagedFile {
+  public:
+    StagedFile(const std::filesystem::path& target, std::string_view content, mode_t mode,
+               off_t size = -1);
+    ~StagedFile();
+    StagedFile(const StagedFile&) = delete;
+    StagedFile& operator=(const StagedFile&) = delete;
+
+    void Publish(BrixSim::Publish how = BrixSim::Publish::Replace);
+
+  private:
+    std::filesystem::path target_;
+    std::filesystem::path temp_;
+    bool published_ = false;
+};
+
+// Stages and publishes at once.
 void WriteDurably(const std::filesystem::path& target, std::string_view content, mode_t mode,
                   Publish how = Publish::Replace, off_t size = -1);
+
+// Removes the temporary files of `target` that writers killed before publishing left behind.
+// Call only while holding what keeps other writers of `target` out.
+void RemoveStaleTemporaries(const std::filesystem::path& target);
 
 }  // namespace BrixSim

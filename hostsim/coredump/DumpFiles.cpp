@@ -14,6 +14,7 @@
 #include <system_error>
 
 #include "cmdkit/Text.h"
+#include "core/DurableWrite.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -73,33 +74,16 @@ void WriteDumpFile(Store& store, const std::string& hostPath, uint64_t bytes) {
         throw HostCtlException("Unable to create folder for " + CmdKit::MessageExcerpt(hostPath) +
                                ": " + ec.message());
     }
-    const fs::path temp = target->parent_path() /
-                          ("." + target->filename().string() + ".tmp" + std::to_string(getpid()));
-    const int fd = ::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
-    if (fd < 0) {
-        throw HostCtlException("Unable to create dump file " + CmdKit::MessageExcerpt(hostPath) +
-                               ": " + std::strerror(errno));
-    }
-    bool ok = ::write(fd, kMagic, sizeof kMagic) == static_cast<ssize_t>(sizeof kMagic) &&
-              ::ftruncate(fd, static_cast<off_t>(bytes)) == 0 && ::fsync(fd) == 0;
-    int error = ok ? 0 : errno;
-    ::close(fd);
-    if (ok && ::link(temp.c_str(), target->c_str()) != 0) {
-        ok = false;
-        error = errno;
-    }
-    ::unlink(temp.c_str());
-    if (!ok) {
-        if (error == EEXIST)
+    try {
+        BrixSim::WriteDurably(*target, std::string_view(kMagic, sizeof kMagic), 0600,
+                              BrixSim::Publish::Create, static_cast<off_t>(bytes));
+    } catch (const std::system_error& error) {
+        if (error.code() == std::errc::file_exists) {
             throw HostCtlException("Dump file " + CmdKit::MessageExcerpt(hostPath) +
                                    " already exists.");
+        }
         throw HostCtlException("Unable to create dump file " + CmdKit::MessageExcerpt(hostPath) +
-                               ": " + std::strerror(error));
-    }
-    const int dir = ::open(target->parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (dir >= 0) {
-        ::fsync(dir);
-        ::close(dir);
+                               ": " + error.code().message());
     }
 }
 

@@ -12,6 +12,7 @@
 #include <system_error>
 #include <vector>
 
+#include "core/DurableWrite.h"
 #include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
@@ -87,34 +88,9 @@ std::string MgmtCmdScript() {
            "exit 127\n";
 }
 
-[[noreturn]] void ThrowErrno(const fs::path& path) {
-    throw std::system_error(errno, std::generic_category(), path.string());
-}
-
-// Writes the script atomically: temporary file, fsync, rename.
 void WriteMgmtCmd(const fs::path& root) {
-    const fs::path dir = root / "bin";
-    fs::create_directories(dir);
-    const fs::path temp = dir / (".mgmt-cmd." + std::to_string(::getpid()));
-    const std::string script = MgmtCmdScript();
-    const int fd = ::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0755);
-    if (fd < 0) ThrowErrno(temp);
-    size_t written = 0;
-    while (written < script.size()) {
-        const ssize_t n = ::write(fd, script.data() + written, script.size() - written);
-        if (n < 0 && errno == EINTR) continue;
-        if (n < 0) {
-            ::close(fd);
-            ThrowErrno(temp);
-        }
-        written += static_cast<size_t>(n);
-    }
-    if (::fchmod(fd, 0755) != 0 || ::fsync(fd) != 0) {
-        ::close(fd);
-        ThrowErrno(temp);
-    }
-    ::close(fd);
-    fs::rename(temp, dir / "mgmt-cmd");
+    fs::create_directories(root / "bin");
+    BrixSim::WriteDurably(root / "bin" / "mgmt-cmd", MgmtCmdScript(), 0755);
 }
 
 // The read cache runs as configured from the next boot on.

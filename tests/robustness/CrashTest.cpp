@@ -134,7 +134,7 @@ ChangeKind SnmpFileKind() {
 int StrayTemporaries(const TempHost& host) {
     int count = 0;
     for (const auto& entry : fs::directory_iterator(host.Root() / "etc/ostrel")) {
-        if (entry.path().filename().string().rfind("snmp.xml.", 0) == 0) ++count;
+        if (entry.path().filename().string().rfind(".snmp.xml.tmp-", 0) == 0) ++count;
     }
     return count;
 }
@@ -204,13 +204,14 @@ TEST(Crash, CommitRemovesTemporariesOfKilledWriters) {
     TempHost host;
     ASSERT_EQ(host.Cli({"system", "uuid", "get"}).status, 0);  // seeds the host
     const fs::path folder = host.Root() / "etc/ostrel";
-    for (const char* name : {"snmp.xml.Ab3dE9", "snmp.xml.000000", "snmp.xml.bak"}) {
+    for (const char* name : {".snmp.xml.tmp-00c0ffee12345678", ".snmp.xml.tmp-ffffffffffffffff",
+                             ".snmp.xml.tmp-short", "snmp.xml.bak"}) {
         std::ofstream(folder / name) << "<snmpAgent>";
     }
     const auto set = host.Cli({"system", "snmp", "set", "--syslocation", "hall-1"});
     ASSERT_EQ(set.status, 0) << set.err;
-    EXPECT_FALSE(fs::exists(folder / "snmp.xml.Ab3dE9"));
-    EXPECT_FALSE(fs::exists(folder / "snmp.xml.000000"));
+    EXPECT_FALSE(fs::exists(folder / ".snmp.xml.tmp-00c0ffee12345678"));
+    EXPECT_FALSE(fs::exists(folder / ".snmp.xml.tmp-ffffffffffffffff"));
     EXPECT_TRUE(fs::exists(folder / "snmp.xml.bak"));
     EXPECT_EQ(StrayTemporaries(host), 1);  // the look-alike
 }

@@ -19,6 +19,7 @@
 #include "agents/snmp/SnmpNotifier.h"
 #include "agents/snmp/SnmpSettings.h"
 #include "agents/snmp/UsmKeys.h"
+#include "core/DurableWrite.h"
 #include "core/Hooks.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
@@ -82,73 +83,32 @@ fs::path HostFile(Store& store, const char* hostPath) {
     return *path;
 }
 
-// A new version of a file, written and flushed beside it; Publish() renames it into place.
-// Dropped unpublished, it is removed.
-class StagedFile {
+// A file of the agent, through the host's one durable write; its failures are the agent's.
+class AgentFile {
   public:
-    StagedFile(const fs::path& target, const std::string& content, mode_t mode) : target_(target) {
+    AgentFile(const fs::path& target, const std::string& content, mode_t mode) {
         std::error_code ignored;
         fs::create_directories(target.parent_path(), ignored);
-        std::string name = target.string() + ".XXXXXX";
-        const int fd = mkostemp(name.data(), O_CLOEXEC);
-        if (fd < 0) SystemFailure("Cannot write " + target.string());
-        temp_ = name;
-        size_t done = 0;
-        bool ok = fchmod(fd, mode) == 0;
-        while (ok && done < content.size()) {
-            const ssize_t wrote = write(fd, content.data() + done, content.size() - done);
-            if (wrote < 0 && errno == EINTR) continue;
-            ok = wrote > 0;
-            if (ok) done += static_cast<size_t>(wrote);
-        }
-        ok = ok && fsync(fd) == 0;
-        const int saved = errno;
-        close(fd);
-        if (!ok) {
-            unlink(temp_.c_str());
-            errno = saved;
-            SystemFailure("Cannot write " + target.string());
-        }
+        AsAgentError([&] { staged_.emplace(target, content, mode); });
     }
-    ~StagedFile() {
-        if (!published_) unlink(temp_.c_str());
-    }
-    StagedFile(const StagedFile&) = delete;
-    StagedFile& operator=(const StagedFile&) = delete;
-
     void Publish() {
-        if (rename(temp_.c_str(), target_.c_str()) != 0) {
-            SystemFailure("Cannot replace " + target_.string());
-        }
-        published_ = true;
-        // Make the rename itself durable.
-        const int dir = open(target_.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-        if (dir >= 0) {
-            fsync(dir);
-            close(dir);
-        }
+        AsAgentError([&] { staged_->Publish(); });
     }
 
   private:
-    fs::path target_;
-    fs::path temp_;
-    bool published_ = false;
-};
-
-// Removes the staged copies of `target` ("<name>.XXXXXX") that writers killed before publishing
-// left behind. Only writers holding the configuration lock stage copies, so under that lock
-// every copy found is stale.
-void RemoveStaleCopies(const fs::path& target) {
-    const std::string prefix = target.filename().string() + ".";
-    constexpr size_t kSuffixLength = 6;  // mkostemp's XXXXXX
-    std::error_code ignored;
-    for (const auto& entry : fs::directory_iterator(target.parent_path(), ignored)) {
-        const std::string name = entry.path().filename().string();
-        if (name.size() == prefix.size() + kSuffixLength && name.rfind(prefix, 0) == 0) {
-            unlink(entry.path().c_str());
+    template <class Work>
+    static void AsAgentError(Work&& work) {
+        try {
+            work();
+        } catch (const std::system_error& error) {
+            std::string message = error.what();
+            message[0] = static_cast<char>(std::toupper(static_cast<unsigned char>(message[0])));
+            throw HostCtlException(message);
         }
     }
-}
+
+    std::optional<BrixSim::StagedFile> staged_;
+};
 
 // Held while a writer reads, merges and replaces the configuration file.
 class ExclusiveLock {
@@ -156,21 +116,15 @@ class ExclusiveLock {
     explicit ExclusiveLock(const fs::path& path) {
         std::error_code ignored;
         fs::create_directories(path.parent_path(), ignored);
-        fd_ = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
-        if (fd_ < 0) SystemFailure("Cannot lock " + std::string(kConfigPath));
-        while (flock(fd_, LOCK_EX) != 0) {
-            if (errno != EINTR) {
-                close(fd_);
-                SystemFailure("Cannot lock " + std::string(kConfigPath));
-            }
+        fd_ = BrixSim::Fd(open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
+        if (!fd_) SystemFailure("Cannot lock " + std::string(kConfigPath));
+        while (flock(fd_.Get(), LOCK_EX) != 0) {
+            if (errno != EINTR) SystemFailure("Cannot lock " + std::string(kConfigPath));
         }
     }
-    ~ExclusiveLock() { close(fd_); }
-    ExclusiveLock(const ExclusiveLock&) = delete;
-    ExclusiveLock& operator=(const ExclusiveLock&) = delete;
 
   private:
-    int fd_ = -1;
+    BrixSim::Fd fd_;
 };
 
 struct Stored {
@@ -220,7 +174,7 @@ void ReadBootState(Store& store, Snmp::AgentState& agent) {
     }
     if (!in.is_open()) {
         boots = 1;
-        StagedFile(path, "engineBoots 1\n", 0644).Publish();
+        AgentFile(path, "engineBoots 1\n", 0644).Publish();
     }
     agent.engineBoots = static_cast<uint32_t>(std::clamp<long long>(boots, 1, 2147483647));
     struct stat info {};
@@ -296,7 +250,7 @@ class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
     void Commit() override {
         auto& store = Begin(kCommit);
         ExclusiveLock lock(HostFile(store, kLockPath));
-        RemoveStaleCopies(HostFile(store, kConfigPath));
+        BrixSim::RemoveStaleTemporaries(HostFile(store, kConfigPath));
         const Stored stored = ReadStored(store);
         if (!stored.wellFormed && !reset_) throw HostCtlException(kNotValid);
         const Snmp::Settings base = reset_ ? Snmp::FactoryDefaults() : loaded_;
@@ -306,7 +260,7 @@ class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
         ApplyChanges(base, current_, next, changes);
         Snmp::CheckConsistency(next);
 
-        std::optional<StagedFile> staged;
+        std::optional<AgentFile> staged;
         if (!stored.exists || !stored.wellFormed || next != stored.settings) {
             staged.emplace(HostFile(store, kConfigPath), Snmp::FormatSettings(next), 0600);
         }
@@ -604,8 +558,8 @@ void Seed(Store& store) {
     Snmp::Settings settings = Snmp::FactoryDefaults();
     settings.options["syslocation"] = "Lindenhall DC, hall 2, rack C14";
     settings.options["syscontact"] = "Brix operations <noc@lindenhall.example>";
-    StagedFile(HostFile(store, kConfigPath), Snmp::FormatSettings(settings), 0600).Publish();
-    StagedFile(HostFile(store, kBootPath), "engineBoots 7\n", 0644).Publish();
+    AgentFile(HostFile(store, kConfigPath), Snmp::FormatSettings(settings), 0600).Publish();
+    AgentFile(HostFile(store, kBootPath), "engineBoots 7\n", 0644).Publish();
 }
 
 const bool registered = [] {
