@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <random>
@@ -54,21 +55,29 @@ void SyncFolder(const fs::path& folder) {
 }  // namespace
 
 StagedFile::StagedFile(const fs::path& target, std::string_view content, mode_t mode, off_t size)
+    : StagedFile(target, std::vector<Extent>{{0, std::string(content)}}, mode, size) {}
+
+StagedFile::StagedFile(const fs::path& target, const std::vector<Extent>& extents, mode_t mode,
+                       off_t size)
     : target_(target) {
     Fd fd = CreateTemporary(target, temp_);
     try {
-        const char* data = content.data();
-        size_t left = content.size();
-        while (left > 0) {
-            const ssize_t done = ::write(fd.Get(), data, left);
-            if (done < 0 && errno == EINTR) continue;
-            if (done <= 0) Fail("cannot write", target, done < 0 ? errno : ENOSPC);
-            data += done;
-            left -= static_cast<size_t>(done);
+        off_t end = 0;
+        for (const auto& extent : extents) {
+            const char* data = extent.data.data();
+            size_t left = extent.data.size();
+            off_t at = extent.offset;
+            while (left > 0) {
+                const ssize_t done = ::pwrite(fd.Get(), data, left, at);
+                if (done < 0 && errno == EINTR) continue;
+                if (done <= 0) Fail("cannot write", target, done < 0 ? errno : ENOSPC);
+                data += done;
+                at += done;
+                left -= static_cast<size_t>(done);
+            }
+            end = std::max(end, at);
         }
-        if (size > static_cast<off_t>(content.size()) && ::ftruncate(fd.Get(), size) != 0) {
-            Fail("cannot size", target, errno);
-        }
+        if (size > end && ::ftruncate(fd.Get(), size) != 0) Fail("cannot size", target, errno);
         if (::fchmod(fd.Get(), mode) != 0) Fail("cannot set the mode of", target, errno);
         if (::fsync(fd.Get()) != 0) Fail("cannot sync", target, errno);
     } catch (...) {

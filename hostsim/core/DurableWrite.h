@@ -5,7 +5,9 @@
 #include <sys/types.h>
 
 #include <filesystem>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/Fd.h"
 
@@ -21,10 +23,18 @@ enum class Publish {
 // `size` beyond the content leaves the rest a hole (sparse files). Publish() puts it in place
 // and syncs the folder; dropped unpublished, the temporary file is removed. Failures throw a
 // std::system_error that names the step and the path; `target` is then as it was.
+// Bytes at an offset of a file; the gaps between extents are holes.
+struct Extent {
+    off_t offset = 0;
+    std::string data;
+};
+
 class StagedFile {
   public:
     StagedFile(const std::filesystem::path& target, std::string_view content, mode_t mode,
                off_t size = -1);
+    StagedFile(const std::filesystem::path& target, const std::vector<Extent>& extents,
+               mode_t mode, off_t size);
     ~StagedFile();
     StagedFile(const StagedFile&) = delete;
     StagedFile& operator=(const StagedFile&) = delete;

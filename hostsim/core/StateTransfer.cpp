@@ -9,11 +9,15 @@
 #include <stdexcept>
 #include <vector>
 
+#include "core/FileTransfer.h"
 #include "core/Store.h"
 
 namespace BrixSim {
 
 namespace {
+
+// 1: the tables only; 2: the tables and the files kept under the root.
+constexpr int kFormatVersion = 2;
 
 std::string Quote(const std::string& identifier) {
     std::string quoted = "\"";
@@ -64,7 +68,7 @@ void BindJson(sqlite3* db, sqlite3_stmt* stmt, int index, const nlohmann::json& 
 
 std::string ExportState(Store& store) {
     nlohmann::ordered_json document;
-    document["version"] = 1;
+    document["version"] = kFormatVersion;
     auto& tables = document["tables"] = nlohmann::ordered_json::object();
     // One read transaction, so the document is a consistent snapshot.
     store.Exec("BEGIN");
@@ -106,6 +110,14 @@ std::string ExportState(Store& store) {
         store.Exec("ROLLBACK");
         throw;
     }
+    // The files, inside the same read transaction: no writer changes them meanwhile, as every
+    // writer holds the store's write lock while it publishes.
+    try {
+        document["files"] = ExportFiles(store.Root());
+    } catch (...) {
+        store.Exec("ROLLBACK");
+        throw;
+    }
     store.Exec("COMMIT");
     return document.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
 }
@@ -122,11 +134,20 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
         return ImportResult{ImportResult::Status::Refused, message};
     };
     if (!document.is_object()) return invalid("the document is not a JSON object");
-    if (!document.contains("version") || document["version"] != 1) {
-        return invalid("\"version\" must be 1");
+    if (!document.contains("version") || !document["version"].is_number_integer() ||
+        (document["version"] != 1 && document["version"] != kFormatVersion)) {
+        return invalid("\"version\" must be 1 (tables only) or " + std::to_string(kFormatVersion) +
+                       " (the whole host)");
     }
     if (!document.contains("tables") || !document["tables"].is_object()) {
         return invalid("\"tables\" must be an object");
+    }
+    const bool withFiles = document["version"] == kFormatVersion;
+    if (withFiles) {
+        if (!document.contains("files")) return invalid("\"files\" is missing");
+        if (const std::string problem = CheckFiles(document["files"]); !problem.empty()) {
+            return invalid(problem);
+        }
     }
     Store& store = openStore();
     const auto known = StateTables(store);
@@ -197,6 +218,8 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
                     }
                 }
             }
+            // Last, so that a table the store refuses leaves the files untouched too.
+            if (withFiles) ImportFiles(store.Root(), document["files"]);
         });
     } catch (const std::runtime_error& e) {
         return invalid(e.what());

@@ -1,5 +1,6 @@
 // The host's state as one JSON document (`brixsim export` / `brixsim import`): every table of
-// the store but SQLite's own and the store's bookkeeping, as {"version": 1, "tables": {...}}.
+// the store but SQLite's own and the store's bookkeeping, and every file kept under the root,
+// as {"version": 2, "tables": {...}, "files": [...]}.
 #pragma once
 
 #include <functional>
@@ -24,7 +25,8 @@ struct ImportResult {
 };
 
 // Replaces the tables the document holds with its rows, in one transaction: either all of them
-// or none. `store` is asked for only once the document's overall shape is right, so a malformed
+// or none; a version 2 document then makes the host's files its own (core/FileTransfer.h).
+// A document that cannot be applied whole is refused before anything changes. `store` is asked for only once the document's overall shape is right, so a malformed
 // document never opens (or creates) a host.
 ImportResult ImportState(std::string_view text, const std::function<Store&()>& store);
 

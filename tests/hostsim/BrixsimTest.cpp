@@ -151,7 +151,7 @@ TEST(Brixsim, ExportImportRoundTrip) {
     Store::Get().Journal("sleep", {{"seconds", int64_t{1}}});
     ASSERT_EQ(host.Sim({"feature", "set", "120", "on"}).status, 0);
     const auto before = host.Export();
-    EXPECT_EQ(before["version"], 1);
+    EXPECT_EQ(before["version"], 2);
     EXPECT_FALSE(before["tables"].contains("meta"));
     ASSERT_TRUE(before["tables"].contains("host"));
     ASSERT_TRUE(before["tables"].contains("journal"));
@@ -185,7 +185,7 @@ TEST(Brixsim, BadImportsChangeNothing) {
     TempHost host;
     Store::Get().SetValue("kept", "yes");
     const auto before = host.Export();
-    const fs::path file = host.Root() / "state.json";
+    const fs::path file = host.Root().string() + "-state.json";
     struct Case {
         std::string document;
         std::string error;
@@ -195,7 +195,26 @@ TEST(Brixsim, BadImportsChangeNothing) {
         {R"({"version":1,"tables":{"host":[{"key":"a","value":"b","colour":"red"}]}})",
          "table \"host\" row 0: unknown column \"colour\""},
         {R"({"version":1,"tables":{"meta":[]}})", "unknown table \"meta\""},
-        {R"({"version":2,"tables":{}})", "\"version\" must be 1"},
+        {R"({"version":3,"tables":{}})",
+         "\"version\" must be 1 (tables only) or 2 (the whole host)"},
+        {R"({"version":2,"tables":{}})", "\"files\" is missing"},
+        // Files that would leave the root, or that cannot be written as given.
+        {R"({"version":2,"tables":{},"files":[{"path":"../x","type":"folder","mode":"0755"}]})",
+         "file entry 0: \"path\" must be a relative path of plain names"},
+        {R"({"version":2,"tables":{},"files":[{"path":"/etc","type":"folder","mode":"0755"}]})",
+         "file entry 0: \"path\" must be a relative path of plain names"},
+        {R"({"version":2,"tables":{},"files":[{"path":"out","type":"link","target":"../../etc"}]})",
+         "file entry 0: a link must point inside the host"},
+        {R"({"version":2,"tables":{},"files":[{"path":"host.db","type":"file","mode":"0644","size":0,"extents":[]}]})",
+         "file entry 0: host.db belongs to the store"},
+        {R"({"version":2,"tables":{},"files":[{"path":"a","type":"file","mode":"0644","size":2,"extents":[{"offset":0,"base64":"QUJD"}]}]})",
+         "file entry 0: an extent lies beyond the file's size"},
+        {R"({"version":2,"tables":{},"files":[{"path":"a","type":"file","mode":"0644","size":9,"extents":[{"offset":0,"base64":"Q!=="}]}]})",
+         "file entry 0: an extent's data is not base64"},
+        {R"({"version":2,"tables":{},"files":[{"path":"a/b","type":"file","mode":"0644","size":0,"extents":[]}]})",
+         "a/b is not in a folder of the document"},
+        {R"({"version":2,"tables":{},"files":[{"path":"a","type":"file","mode":"rw","size":0,"extents":[]}]})",
+         "file entry 0: \"mode\" must be an octal text such as \"0644\""},
         {R"({"version":1,"tables":{"host":{}}})", "table \"host\" is not an array of rows"},
         {R"({"version":1,"tables":{"host":[{"key":"a","value":[1]}]}})",
          "table \"host\" row 0 column \"value\": not a scalar value"},
@@ -219,6 +238,7 @@ TEST(Brixsim, BadImportsChangeNothing) {
     EXPECT_EQ(host.Sim({"import", file.string()}).status, 1);
     EXPECT_EQ(host.Sim({"import", (host.Root() / "missing.json").string()}).status, 1);
     EXPECT_EQ(host.Export(), before);
+    fs::remove(file);
 }
 
 TEST(Brixsim, ImportReadsStandardInput) {

@@ -43,8 +43,8 @@ constexpr const char* kUsage =
     "  fault list                          the armed faults, as JSON lines\n"
     "  fault ops                           every operation that can be made to fail\n"
     "  journal [--clear]                   print the journal as JSON lines (--clear: empty it)\n"
-    "  export                              print the host's state as one JSON document\n"
-    "  import FILE                         replace the tables FILE holds (- for standard input)\n"
+    "  export                              print the whole host (tables and files) as JSON\n"
+    "  import FILE                         make the host what FILE holds (- for standard input)\n"
     "  feature set ENTRY on|off            switch a feature entry (0-255)\n"
     "  feature get ENTRY                   print on or off\n";
 
