@@ -9,6 +9,7 @@
 #include <boost/algorithm/string/split.hpp>
 #include <cerrno>
 #include <cstring>
+#include <utility>
 
 #include "cmdkit/AutoCli.h"
 
@@ -18,20 +19,41 @@ namespace CmdKit::AutoCli {
 
 namespace {
 
-// Runs argv[0] as given (no shell, no PATH search) and collects what it writes to standard
-// output and standard error, in the order it writes it.
+// Runs argv[0] as given: no shell, no PATH search.
 int DefaultRunner(const std::vector<std::string>& argv, const std::string& /*user*/,
                   std::string& output) {
+    return RunProgram(argv[0], argv, output);
+}
+
+// Closes a pipe end once.
+struct PipeEnd {
+    int fd = -1;
+    ~PipeEnd() {
+        if (fd >= 0) close(fd);
+    }
+};
+
+std::atomic<HostCommandRunner> runner{&DefaultRunner};
+
+}  // namespace
+
+int RunProgram(const std::string& program, const std::vector<std::string>& argv,
+               std::string& output) {
+    output.clear();
     int fds[2];
     if (pipe2(fds, O_CLOEXEC) != 0) {
         output = "Cannot run " + argv[0] + ": " + std::strerror(errno);
-        return 127;
+        return 126;
     }
+    PipeEnd reader{fds[0]};
+    PipeEnd writer{fds[1]};
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    posix_spawn_file_actions_adddup2(&actions, fds[1], STDOUT_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, fds[1], STDERR_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, writer.fd, STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, writer.fd, STDERR_FILENO);
+    // A descriptor the caller left open without close-on-exec is none of the program's.
+    posix_spawn_file_actions_addclosefrom_np(&actions, STDERR_FILENO + 1);
 
     std::vector<char*> args;
     args.reserve(argv.size() + 1);
@@ -39,42 +61,33 @@ int DefaultRunner(const std::vector<std::string>& argv, const std::string& /*use
     args.push_back(nullptr);
 
     pid_t pid = 0;
-    int rc = posix_spawn(&pid, argv[0].c_str(), &actions, nullptr, args.data(), environ);
+    const int error = posix_spawn(&pid, program.c_str(), &actions, nullptr, args.data(), environ);
     posix_spawn_file_actions_destroy(&actions);
-    close(fds[1]);
-    if (rc != 0) {
-        close(fds[0]);
-        output = "Cannot run " + argv[0] + ": " + std::strerror(rc);
-        return 127;
+    close(std::exchange(writer.fd, -1));
+    if (error != 0) {
+        output = "Cannot run " + argv[0] + ": " + std::strerror(error);
+        return error == ENOENT ? 127 : 126;
     }
-
-    output.clear();
     char buffer[4096];
     for (;;) {
-        ssize_t n = read(fds[0], buffer, sizeof buffer);
+        const ssize_t n = read(reader.fd, buffer, sizeof buffer);
         if (n > 0) {
             output.append(buffer, static_cast<size_t>(n));
         } else if (n == 0 || errno != EINTR) {
             break;
         }
     }
-    close(fds[0]);
-
     int status = 0;
     while (waitpid(pid, &status, 0) < 0) {
         if (errno != EINTR) {
-            output += std::string("Cannot wait for ") + argv[0] + ": " + std::strerror(errno);
-            return 127;
+            output += "Cannot wait for " + argv[0] + ": " + std::strerror(errno);
+            return 126;
         }
     }
     if (WIFEXITED(status)) return WEXITSTATUS(status);
     if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
-    return 127;
+    return 126;
 }
-
-std::atomic<HostCommandRunner> runner{&DefaultRunner};
-
-}  // namespace
 
 void SetHostCommandRunner(HostCommandRunner newRunner) {
     runner.store(newRunner ? newRunner : &DefaultRunner);

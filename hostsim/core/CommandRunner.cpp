@@ -1,10 +1,7 @@
 // Runs host command lines for the framework: the program is the file at its host path under the
 // root or, failing that, the simulator's own build of it (brixsim-<name> beside the tools).
 #include <dlfcn.h>
-#include <fcntl.h>
-#include <spawn.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -15,8 +12,6 @@
 
 #include "cmdkit/AutoCli.h"
 #include "core/Store.h"
-
-extern char** environ;
 
 namespace {
 
@@ -40,49 +35,8 @@ fs::path ProgramDir() {
     return library.parent_path().parent_path() / "bin";
 }
 
-// Runs `program` with `argv`, collecting standard output and error together.
 int Spawn(const fs::path& program, const std::vector<std::string>& argv, std::string& output) {
-    int pipeFds[2];
-    if (pipe2(pipeFds, O_CLOEXEC) != 0) {
-        output = "Cannot run " + argv[0] + ": " + std::strerror(errno);
-        return 126;
-    }
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
-    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], 1);
-    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], 2);
-
-    std::vector<char*> args;
-    for (const auto& arg : argv) args.push_back(const_cast<char*>(arg.c_str()));
-    args.push_back(nullptr);
-
-    pid_t pid = 0;
-    const int error = posix_spawn(&pid, program.c_str(), &actions, nullptr, args.data(), environ);
-    posix_spawn_file_actions_destroy(&actions);
-    ::close(pipeFds[1]);
-    if (error != 0) {
-        ::close(pipeFds[0]);
-        output = "Cannot run " + argv[0] + ": " + std::strerror(error);
-        return error == ENOENT ? 127 : 126;
-    }
-    char buffer[4096];
-    for (;;) {
-        const ssize_t got = ::read(pipeFds[0], buffer, sizeof buffer);
-        if (got > 0) {
-            output.append(buffer, static_cast<size_t>(got));
-        } else if (got == 0 || errno != EINTR) {
-            break;
-        }
-    }
-    ::close(pipeFds[0]);
-    int status = 0;
-    while (waitpid(pid, &status, 0) < 0) {
-        if (errno != EINTR) return 126;
-    }
-    if (WIFEXITED(status)) return WEXITSTATUS(status);
-    if (WIFSIGNALED(status)) return 128 + WTERMSIG(status);
-    return 126;
+    return CmdKit::AutoCli::RunProgram(program.string(), argv, output);
 }
 
 int RunHostCommand(const std::vector<std::string>& argv, const std::string& user,

@@ -127,6 +127,13 @@ using HostCommandRunner = int (*)(const std::vector<std::string>& argv, const st
                                   std::string& output);
 void SetHostCommandRunner(HostCommandRunner runner);
 
+// The one way a program is started: `program` runs with `argv`, standard input from /dev/null,
+// standard output and error collected together into `output`, and no other descriptor of the
+// caller. Returns its exit status, 128 + the signal that ended it, or, with a message in
+// `output`, 127 when there is no such program and 126 when it cannot be run.
+int RunProgram(const std::string& program, const std::vector<std::string>& argv,
+               std::string& output);
+
 // What every command's execution runs inside: the scope calls `execute` once. The host library
 // installs one to give a command one consistent view of the host (and to read it without
 // locking it once per call); the default just executes.

@@ -1,5 +1,7 @@
 // The command tree, command objects and the host command runner.
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "FakeCommand.h"
 
@@ -127,6 +129,25 @@ TEST(ShellCmd, DefaultRunnerCapturesOutputAndStatus) {
     EXPECT_NE(AutoCli::AutoCli_ShellCmdWithKvUsername("echo hi", "u", output, ""), 0);
     EXPECT_NE(output.find("Cannot run echo"), std::string::npos) << output;
     EXPECT_NE(AutoCli::AutoCli_ShellCmdWithKvUsername("   ", "u", output, ""), 0);
+}
+
+// The program gets standard input, output and error, and nothing else the caller holds open.
+TEST(ShellCmd, NoDescriptorOfTheCallerReachesTheProgram) {
+    const int leaked = open("/dev/null", O_RDONLY);  // deliberately without close-on-exec
+    ASSERT_GE(leaked, 3);
+    std::string output;
+    const std::string fd = std::to_string(leaked);
+    EXPECT_EQ(AutoCli::RunProgram("/bin/sh",
+                                  {"sh", "-c",
+                                   "test -e /proc/self/fd/" + fd +
+                                       " && echo leaked; "
+                                       "test -e /proc/self/fd/2 && echo stderr"},
+                                  output),
+              0);
+    close(leaked);
+    EXPECT_EQ(output, "stderr\n");
+    EXPECT_EQ(AutoCli::RunProgram("/no/such/program", {"x"}, output), 127);
+    EXPECT_EQ(output, "Cannot run x: No such file or directory");
 }
 
 }  // namespace
