@@ -19,6 +19,7 @@
 #include <utility>
 
 #include "core/DurableWrite.h"
+#include "core/Fd.h"
 #include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
 
@@ -134,11 +135,10 @@ void ExecRaw(sqlite3* db, std::string_view sql) {
 void TraceOperation(std::string_view operation) {
     const char* trace = getenv("BRIXSIM_TRACE_OPS");
     if (!trace || !*trace) return;
-    const int fd = open(trace, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644);
-    if (fd < 0) return;
+    const Fd fd(open(trace, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644));
+    if (!fd) return;
     const std::string line = std::string(operation) + "\n";
-    [[maybe_unused]] const ssize_t wrote = write(fd, line.data(), line.size());
-    close(fd);
+    [[maybe_unused]] const ssize_t wrote = write(fd.Get(), line.data(), line.size());
 }
 
 void DecrementFault(Store& store, const std::string& operation) {

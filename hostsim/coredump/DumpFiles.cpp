@@ -15,6 +15,7 @@
 
 #include "cmdkit/Text.h"
 #include "core/DurableWrite.h"
+#include "core/Fd.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -143,10 +144,9 @@ bool IsValidFile(Store& store, const std::string& hostPath, bool checkHeader) {
     }
     if (!checkHeader) return true;
     char head[sizeof kMagic] = {};
-    const int fd = ::open(resolved->c_str(), O_RDONLY | O_CLOEXEC);
-    if (fd < 0) return false;
-    const bool read = ::read(fd, head, sizeof head) == static_cast<ssize_t>(sizeof head);
-    ::close(fd);
+    const BrixSim::Fd fd(::open(resolved->c_str(), O_RDONLY | O_CLOEXEC));
+    if (!fd) return false;
+    const bool read = ::read(fd.Get(), head, sizeof head) == static_cast<ssize_t>(sizeof head);
     return read && std::memcmp(head, kMagic, sizeof kMagic) == 0;
 }
 

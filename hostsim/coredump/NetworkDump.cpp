@@ -12,6 +12,7 @@
 #include <cstring>
 
 #include "cmdkit/Text.h"
+#include "core/Fd.h"
 #include "core/Store.h"
 #include "hostctl/Host.h"
 #include "hostctl/HostCtlException.h"
@@ -140,8 +141,9 @@ std::string Probe(const std::string& server, uint32_t port, int timeoutMs) {
     } else {
         return "Invalid netdump server address " + server;
     }
-    const int fd = ::socket(family, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-    if (fd < 0) return std::string("Unable to open a socket: ") + std::strerror(errno);
+    const BrixSim::Fd socket(::socket(family, SOCK_DGRAM | SOCK_CLOEXEC, 0));
+    if (!socket) return std::string("Unable to open a socket: ") + std::strerror(errno);
+    const int fd = socket.Get();
     std::string error;
     // A connected socket reports a refused port as an error on the next receive.
     if (::connect(fd, reinterpret_cast<sockaddr*>(&address), length) != 0 ||
@@ -158,7 +160,6 @@ std::string Probe(const std::string& server, uint32_t port, int timeoutMs) {
             error = "Netdump server at " + where + " is not reachable: " + std::strerror(errno);
         }
     }
-    ::close(fd);
     return error;
 }
 

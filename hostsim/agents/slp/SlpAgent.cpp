@@ -31,6 +31,7 @@
 #include "agents/slp/SlpDaemon.h"
 #include "agents/slp/SlpWire.h"
 #include "cmdkit/Text.h"
+#include "core/Fd.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 
@@ -76,20 +77,6 @@ std::string ErrnoText(int error) {
     return std::strerror(error);
 }
 
-class Socket {
-public:
-    explicit Socket(int fd) : fd_(fd) {}
-    ~Socket() {
-        if (fd_ >= 0) ::close(fd_);
-    }
-    Socket(const Socket&) = delete;
-    Socket& operator=(const Socket&) = delete;
-    int Fd() const { return fd_; }
-
-private:
-    int fd_;
-};
-
 struct Settings {
     std::string interface;
     std::string scopes;
@@ -105,8 +92,8 @@ Settings ReadSettings() {
     };
     std::string interface = store.GetValue("slp.ua.interface", "");
     if (interface.empty()) interface = kLoopback;
-    return {interface, store.GetValue("slp.ua.scopes", "DEFAULT"),
-            wait("slp.ua.multicast_wait_ms"), wait("slp.ua.unicast_wait_ms")};
+    return {interface, store.GetValue("slp.ua.scopes", "DEFAULT"), wait("slp.ua.multicast_wait_ms"),
+            wait("slp.ua.unicast_wait_ms")};
 }
 
 uint16_t NewXid() {
@@ -139,23 +126,23 @@ void AddEntries(const Reply& reply, std::set<std::string>& seen, std::vector<SLP
 }
 
 class SlpAgentImpl final : public HostCtl::System::SlpAgent {
-public:
+  public:
     void Search(std::vector<SLPSvc>& services) override {
         Store::Get().Check(kSearch);
         services.clear();
         const Settings settings = ReadSettings();
 
-        Socket socket(::socket(AF_INET, SOCK_DGRAM | SOCK_CLOEXEC, 0));
-        if (socket.Fd() < 0) Fail("SLP multicast search failed: " + ErrnoText(errno));
+        BrixSim::Fd socket(::socket(AF_INET, SOCK_DGRAM | SOCK_CLOEXEC, 0));
+        if (socket.Get() < 0) Fail("SLP multicast search failed: " + ErrnoText(errno));
         const int ttl = 255;
-        ::setsockopt(socket.Fd(), IPPROTO_IP, IP_MULTICAST_TTL, &ttl, sizeof ttl);
+        ::setsockopt(socket.Get(), IPPROTO_IP, IP_MULTICAST_TTL, &ttl, sizeof ttl);
         {
             in_addr address{};
             if (::inet_pton(AF_INET, settings.interface.c_str(), &address) != 1) {
                 Fail("Invalid SLP multicast interface address: " +
                      CmdKit::MessageExcerpt(settings.interface));
             }
-            if (::setsockopt(socket.Fd(), IPPROTO_IP, IP_MULTICAST_IF, &address, sizeof address) !=
+            if (::setsockopt(socket.Get(), IPPROTO_IP, IP_MULTICAST_IF, &address, sizeof address) !=
                 0) {
                 Fail("SLP multicast search failed: " + ErrnoText(errno));
             }
@@ -185,15 +172,15 @@ public:
             }
             request.previousResponders = previous;
             const auto message = BuildServiceRequest(request);
-            if (::sendto(socket.Fd(), message.data(), message.size(), 0,
+            if (::sendto(socket.Get(), message.data(), message.size(), 0,
                          reinterpret_cast<const sockaddr*>(&group), sizeof group) < 0) {
                 Fail("SLP multicast search failed: " + ErrnoText(errno));
             }
             std::vector<uint8_t> buffer(65536);
-            while (WaitReadable(socket.Fd(), roundEnd)) {
+            while (WaitReadable(socket.Get(), roundEnd)) {
                 sockaddr_in from{};
                 socklen_t fromLength = sizeof from;
-                const ssize_t size = ::recvfrom(socket.Fd(), buffer.data(), buffer.size(), 0,
+                const ssize_t size = ::recvfrom(socket.Get(), buffer.data(), buffer.size(), 0,
                                                 reinterpret_cast<sockaddr*>(&from), &fromLength);
                 if (size <= 0) continue;
                 const auto reply = ParseReply(buffer.data(), static_cast<size_t>(size));
@@ -270,7 +257,7 @@ public:
         ReadDaemonStats(stats);
     }
 
-private:
+  private:
     [[noreturn]] static void Fail(const std::string& message) { throw HostCtlException(message); }
 
     // Service types are URL schemes below "service:", in any case; a bare name is taken as such
@@ -291,21 +278,21 @@ private:
         const auto start = Clock::now();
         const Clock::time_point roundEnds[] = {start + (deadline - start) / 3, deadline};
         for (const addrinfo* address = &addresses; address; address = address->ai_next) {
-            Socket socket(::socket(address->ai_family, SOCK_DGRAM | SOCK_CLOEXEC, 0));
-            if (socket.Fd() < 0) continue;
+            BrixSim::Fd socket(::socket(address->ai_family, SOCK_DGRAM | SOCK_CLOEXEC, 0));
+            if (socket.Get() < 0) continue;
             // Connected, so that only the node's datagrams arrive and a closed port is
             // reported at once instead of after the whole wait.
-            if (::connect(socket.Fd(), address->ai_addr, address->ai_addrlen) != 0) continue;
+            if (::connect(socket.Get(), address->ai_addr, address->ai_addrlen) != 0) continue;
             std::vector<uint8_t> buffer(65536);
             bool refused = false;
             for (const auto roundEnd : roundEnds) {
-                if (::send(socket.Fd(), message.data(), message.size(), 0) < 0) {
+                if (::send(socket.Get(), message.data(), message.size(), 0) < 0) {
                     refused = errno == ECONNREFUSED;
                     if (!refused) Fail("SLP search failed: " + ErrnoText(errno));
                     break;
                 }
-                while (!refused && WaitReadable(socket.Fd(), roundEnd)) {
-                    const ssize_t size = ::recv(socket.Fd(), buffer.data(), buffer.size(), 0);
+                while (!refused && WaitReadable(socket.Get(), roundEnd)) {
+                    const ssize_t size = ::recv(socket.Get(), buffer.data(), buffer.size(), 0);
                     if (size < 0 && errno == EINTR) continue;
                     if (size < 0) {
                         refused = errno == ECONNREFUSED;
@@ -328,15 +315,15 @@ private:
                                     Clock::time_point deadline) {
         int lastError = ETIMEDOUT;
         for (const addrinfo* address = &addresses; address; address = address->ai_next) {
-            Socket socket(
+            BrixSim::Fd socket(
                 ::socket(address->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
-            if (socket.Fd() < 0) {
+            if (socket.Get() < 0) {
                 lastError = errno;
                 continue;
             }
-            if (!Connect(socket.Fd(), *address, deadline, lastError)) continue;
-            if (!SendAll(socket.Fd(), message, deadline)) return std::nullopt;
-            return ReadReply(socket.Fd(), deadline);
+            if (!Connect(socket.Get(), *address, deadline, lastError)) continue;
+            if (!SendAll(socket.Get(), message, deadline)) return std::nullopt;
+            return ReadReply(socket.Get(), deadline);
         }
         Fail("Unable to connect to '" + CmdKit::MessageExcerpt(node) + "' port " +
              std::to_string(port_) + ": " + ErrnoText(lastError));

@@ -17,6 +17,7 @@
 #include "agents/snmp/Ber.h"
 #include "agents/snmp/SnmpMessages.h"
 #include "agents/snmp/UsmKeys.h"
+#include "core/Fd.h"
 
 namespace BrixSim::Snmp {
 
@@ -63,24 +64,22 @@ class UdpPeer {
             getaddrinfo(to.host.c_str(), std::to_string(to.port).c_str(), &hints, &found);
         if (status != 0) Fail("cannot resolve " + to.host + ": " + gai_strerror(status));
         std::string error;
-        for (addrinfo* at = found; at != nullptr && fd_ < 0; at = at->ai_next) {
-            const int fd = socket(at->ai_family, at->ai_socktype | SOCK_CLOEXEC, at->ai_protocol);
-            if (fd < 0 || connect(fd, at->ai_addr, at->ai_addrlen) != 0) {
+        for (addrinfo* at = found; at != nullptr && !fd_; at = at->ai_next) {
+            BrixSim::Fd fd(socket(at->ai_family, at->ai_socktype | SOCK_CLOEXEC, at->ai_protocol));
+            if (!fd || connect(fd.Get(), at->ai_addr, at->ai_addrlen) != 0) {
                 error = std::strerror(errno);
-                if (fd >= 0) close(fd);
                 continue;
             }
-            fd_ = fd;
+            fd_ = std::move(fd);
         }
         freeaddrinfo(found);
-        if (fd_ < 0) Fail("cannot reach " + Describe(to) + ": " + error);
+        if (!fd_) Fail("cannot reach " + Describe(to) + ": " + error);
     }
-    ~UdpPeer() { close(fd_); }
     UdpPeer(const UdpPeer&) = delete;
     UdpPeer& operator=(const UdpPeer&) = delete;
 
     void Send(const std::string& message) {
-        const ssize_t sent = send(fd_, message.data(), message.size(), 0);
+        const ssize_t sent = send(fd_.Get(), message.data(), message.size(), 0);
         if (sent != static_cast<ssize_t>(message.size())) {
             Fail(std::string("send failed: ") + std::strerror(errno));
         }
@@ -88,12 +87,12 @@ class UdpPeer {
 
     // The next datagram, or nullopt when none came within the timeout.
     std::optional<std::string> Receive(int timeoutMs) {
-        pollfd waiting{fd_, POLLIN, 0};
+        pollfd waiting{fd_.Get(), POLLIN, 0};
         const int ready = poll(&waiting, 1, timeoutMs);
         if (ready < 0) Fail(std::string("poll failed: ") + std::strerror(errno));
         if (ready == 0) return std::nullopt;
         std::string buffer(65536, '\0');
-        const ssize_t got = recv(fd_, buffer.data(), buffer.size(), 0);
+        const ssize_t got = recv(fd_.Get(), buffer.data(), buffer.size(), 0);
         if (got < 0) Fail(std::string("no answer: ") + std::strerror(errno));
         buffer.resize(static_cast<size_t>(got));
         return buffer;
@@ -103,7 +102,7 @@ class UdpPeer {
     std::string LocalIpv4() const {
         sockaddr_storage local{};
         socklen_t size = sizeof local;
-        if (getsockname(fd_, reinterpret_cast<sockaddr*>(&local), &size) == 0 &&
+        if (getsockname(fd_.Get(), reinterpret_cast<sockaddr*>(&local), &size) == 0 &&
             local.ss_family == AF_INET) {
             const auto& address = reinterpret_cast<const sockaddr_in&>(local).sin_addr;
             return std::string(reinterpret_cast<const char*>(&address), 4);
@@ -112,7 +111,7 @@ class UdpPeer {
     }
 
   private:
-    int fd_ = -1;
+    BrixSim::Fd fd_;
 };
 
 std::vector<VarBind> WarmStartBindings(const AgentState& agent) {
