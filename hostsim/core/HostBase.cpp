@@ -1,7 +1,6 @@
 // Host base library: the feature switches, loaded from the host's features table.
 #include "hostbase/HostBase.h"
 
-#include <cstring>
 #include <exception>
 
 #include "core/Store.h"
@@ -23,19 +22,14 @@ extern "C" {
 
 unsigned char* FeatureList[kFeatureCount];
 
+// Read without opening the store, so that help and the command list make no host.
 int FeatureState_Init(void) {
     for (int entry = 0; entry < kFeatureCount; ++entry) FeatureList[entry] = &featureStates[entry];
-    std::memset(featureStates, 0, sizeof featureStates);
     try {
-        auto rows = BrixSim::Store::Get().Prepare("SELECT entry, state FROM features");
-        while (rows.Step()) {
-            const int64_t entry = rows.Int(0);
-            if (entry >= 0 && entry < kFeatureCount) featureStates[entry] = rows.Int(1) != 0;
-        }
+        return BrixSim::Store::PeekFeatures(featureStates, kFeatureCount) ? 0 : -1;
     } catch (const std::exception&) {
         return -1;
     }
-    return 0;
 }
 
 int Preference_Init(void) {

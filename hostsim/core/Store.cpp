@@ -259,6 +259,39 @@ void Store::Close() {
     PendingHits().clear();
 }
 
+bool Store::PeekFeatures(unsigned char* states, int count) {
+    std::fill(states, states + count, 0);
+    {
+        std::lock_guard lock(InstanceMutex());
+        if (Instance()) {
+            auto rows = Instance()->Prepare("SELECT entry, state FROM features");
+            while (rows.Step()) {
+                const int64_t entry = rows.Int(0);
+                if (entry >= 0 && entry < count) states[entry] = rows.Int(1) != 0;
+            }
+            return true;
+        }
+    }
+    const fs::path file = DefaultRoot() / "host.db";
+    std::error_code ec;
+    if (!fs::exists(file, ec)) return true;
+    sqlite3* db = nullptr;
+    const std::string uri = "file:" + file.string() + "?mode=ro";
+    bool read = sqlite3_open_v2(uri.c_str(), &db, SQLITE_OPEN_READONLY | SQLITE_OPEN_URI,
+                                nullptr) == SQLITE_OK;
+    sqlite3_stmt* rows = nullptr;
+    read = read && sqlite3_prepare_v2(db, "SELECT entry, state FROM features", -1, &rows,
+                                      nullptr) == SQLITE_OK;
+    int rc = SQLITE_DONE;
+    while (read && (rc = sqlite3_step(rows)) == SQLITE_ROW) {
+        const int64_t entry = sqlite3_column_int64(rows, 0);
+        if (entry >= 0 && entry < count) states[entry] = sqlite3_column_int64(rows, 1) != 0;
+    }
+    sqlite3_finalize(rows);
+    sqlite3_close_v2(db);
+    return read && rc == SQLITE_DONE;
+}
+
 fs::path Store::DefaultRoot() {
     if (const char* root = getenv("BRIX_HOST_ROOT"); root && *root) {
         return fs::absolute(root).lexically_normal();
@@ -278,6 +311,9 @@ Store::Store(fs::path root) : root_(std::move(root)) {}
 
 Store::~Store() {
     for (auto& [sql, cached] : statements_) sqlite3_finalize(cached.stmt);
+    // Only a process that wrote folds the log back into the database as it leaves: one that
+    // only read leaves the store's files as it found them.
+    if (db_ && wrote_) sqlite3_db_config(db_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 0, nullptr);
     if (db_) sqlite3_close_v2(db_);
 }
 
@@ -433,6 +469,7 @@ void Store::Open() {
     }
     sqlite3_extended_result_codes(db_, 1);
     sqlite3_busy_timeout(db_, kBusyTimeoutMs);
+    sqlite3_db_config(db_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
     try {
         SwitchToWal();
     } catch (const StoreError& error) {
@@ -678,6 +715,7 @@ void Store::Write(const std::function<void()>& work) {
         try {
             work();
             Exec("COMMIT");
+            wrote_ = true;
         } catch (...) {
             writeDepth_ = 0;
             sqlite3_exec(db_, "ROLLBACK", nullptr, nullptr, nullptr);

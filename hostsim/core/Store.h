@@ -100,6 +100,10 @@ class Store {
     static Store& Get();
     // Closes the process-wide store so the next Get() opens the root named by the environment.
     static void Close();
+    // The feature switches of the current root, read without opening the store: no host is
+    // made, nothing is checked or written. A root without a host has every switch off. False
+    // when a host is there but its switches cannot be read.
+    static bool PeekFeatures(unsigned char* states, int count);
     // The host root as the environment names it (without opening anything).
     static std::filesystem::path DefaultRoot();
     // The file that marks a folder as a complete host, and the top-level entries the host made.
@@ -169,6 +173,7 @@ class Store {
     std::filesystem::path root_;
     sqlite3* db_ = nullptr;
     bool readOnly_ = false;  // a host on a folder this process cannot write
+    bool wrote_ = false;     // this process committed a write
     int writeDepth_ = 0;
     int readDepth_ = 0;
     uint64_t readSnapshot_ = 0;
