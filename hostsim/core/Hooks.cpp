@@ -14,13 +14,6 @@ std::vector<TableSet>& Tables() {
     return tables;
 }
 
-// Kept as given (names of static storage) and sorted only when asked for: every process
-// registers them all at load, few ever list them.
-std::vector<const char*>& Operations() {
-    static std::vector<const char*> operations;
-    return operations;
-}
-
 std::map<uint32_t, SysinfoNode>& SysinfoNodes() {
     static std::map<uint32_t, SysinfoNode> nodes;
     return nodes;
@@ -55,11 +48,6 @@ bool RegisterTables(TableSet tables) {
         }
     }
     Tables().push_back(std::move(tables));
-    return true;
-}
-
-bool RegisterOperations(std::initializer_list<const char*> operations) {
-    Operations().insert(Operations().end(), operations.begin(), operations.end());
     return true;
 }
 
@@ -105,11 +93,6 @@ void RunBootSteps(Store& store) {
 
 const std::vector<TableSet>& RegisteredTables() {
     return Tables();
-}
-
-std::vector<std::string> RegisteredOperations() {
-    std::set<std::string> sorted(Operations().begin(), Operations().end());
-    return {sorted.begin(), sorted.end()};
 }
 
 const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes() {

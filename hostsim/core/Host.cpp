@@ -1,13 +1,14 @@
 // The host object and its system interface; each area defines its own SystemInfo methods.
 #include "hostctl/Host.h"
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/SystemInfo.h"
 
 namespace {
 
-const bool registered =
-    BrixSim::RegisterOperations({"HostCtl::HostFactory::GetHost", "HostCtl::Host::GetSystemInfo"});
+const BrixSim::Operation kGetSystemInfo{"HostCtl::Host::GetSystemInfo"};
+const BrixSim::Operation kGetHost{"HostCtl::HostFactory::GetHost"};
 
 }  // namespace
 
@@ -17,14 +18,14 @@ Host::Host() = default;
 Host::~Host() = default;
 
 std::unique_ptr<System::SystemInfo> Host::GetSystemInfo() {
-    BrixSim::Store::Get().Check("HostCtl::Host::GetSystemInfo");
+    BrixSim::Store::Get().Check(kGetSystemInfo);
     return std::make_unique<System::SystemInfo>();
 }
 
 namespace HostFactory {
 
 std::unique_ptr<Host> GetHost() {
-    BrixSim::Store::Get().Check("HostCtl::HostFactory::GetHost");
+    BrixSim::Store::Get().Check(kGetHost);
     return std::make_unique<Host>();
 }
 

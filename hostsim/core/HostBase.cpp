@@ -7,6 +7,8 @@
 
 namespace {
 
+const BrixSim::Operation kPreferenceInit{"Preference_Init"};
+
 unsigned char featureStates[kFeatureCount];
 
 // Points every FeatureList entry at its state byte; done at load so the table is usable
@@ -35,7 +37,8 @@ int FeatureState_Init(void) {
 int Preference_Init(void) {
     try {
         auto& store = BrixSim::Store::Get();
-        store.Write([&] { store.JournalCall("Preference_Init", {}); });
+        store.Check(kPreferenceInit);
+        store.Write([&] { store.JournalCall(kPreferenceInit, {}); });
     } catch (const std::exception&) {
         return -1;
     }

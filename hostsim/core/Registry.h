@@ -14,7 +14,6 @@ namespace BrixSim {
 // Every area's tables, in registration order.
 const std::vector<TableSet>& RegisteredTables();
 // Every operation name that can be made to fail, sorted and without duplicates.
-std::vector<std::string> RegisteredOperations();
 const std::map<uint32_t, SysinfoNode>& RegisteredSysinfoNodes();
 const std::map<std::string, FileSystemType>& RegisteredFileSystemTypes();
 // The removal handler of a held file, or null.

@@ -646,7 +646,8 @@ std::optional<fs::path> Store::Resolve(std::string_view hostPath) const {
     return parent / parts.back();
 }
 
-void Store::Check(std::string_view operation) {
+void Store::Check(const Operation& checked) {
+    const std::string_view operation = checked.Name();
     TraceOperation(operation);
     // Inside a read transaction the armed faults cannot change (a fault that fires writes, and
     // that ends the transaction): read them once, not once a call.
@@ -806,10 +807,10 @@ void Store::Journal(std::string_view kind, const Fields& fields) {
     Prepare("INSERT INTO journal (record) VALUES (?)").Bind(1, text).Run();
 }
 
-void Store::JournalCall(std::string_view operation, const std::vector<Value>& args) {
+void Store::JournalCall(const Operation& operation, const std::vector<Value>& args) {
     nlohmann::ordered_json record;
     record["kind"] = "call";
-    record["op"] = operation;
+    record["op"] = operation.Name();
     record["args"] = nlohmann::ordered_json::array();
     for (const auto& arg : args) record["args"].push_back(ToJson(arg));
     const std::string text =

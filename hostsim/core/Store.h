@@ -17,6 +17,8 @@
 #include <variant>
 #include <vector>
 
+#include "core/Operation.h"
+
 struct sqlite3;
 struct sqlite3_stmt;
 
@@ -87,10 +89,6 @@ struct TableSet {
 };
 bool RegisterTables(TableSet tables);
 
-// Names of platform operations that can be made to fail, for `brixsim fault ops`. The names
-// must outlive the process (string literals): they are kept as given.
-bool RegisterOperations(std::initializer_list<const char*> operations);
-
 class Store {
   public:
     // The store of the current host root ($BRIX_HOST_ROOT, or the default root), opened on
@@ -125,7 +123,7 @@ class Store {
     std::optional<std::filesystem::path> Resolve(std::string_view hostPath) const;
 
     // Throws HostCtl::Lib::HostCtlException when a fault is armed for `operation`.
-    void Check(std::string_view operation);
+    void Check(const Operation& operation);
 
     // Runs `work` in one write transaction (BEGIN IMMEDIATE ... COMMIT), rolled back if it
     // throws. Nested calls join the outer transaction.
@@ -154,7 +152,7 @@ class Store {
     // Appends a record {"kind": kind, fields...} to the journal.
     void Journal(std::string_view kind, const Fields& fields);
     // Appends {"kind":"call","op":operation,"args":[...]}.
-    void JournalCall(std::string_view operation, const std::vector<Value>& args);
+    void JournalCall(const Operation& operation, const std::vector<Value>& args);
 
     ~Store();
 

@@ -1,13 +1,14 @@
 // Kernel system-information records, answered by the node handlers the areas register.
 #include "kernctl/Sysinfo.h"
 
+#include "core/Operation.h"
 #include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
 
 namespace {
 
-const bool registered =
-    BrixSim::RegisterOperations({"KernCtl::Util::Sysinfo::Get", "KernCtl::Util::Sysinfo::List"});
+const BrixSim::Operation kGet{"KernCtl::Util::Sysinfo::Get"};
+const BrixSim::Operation kList{"KernCtl::Util::Sysinfo::List"};
 
 const BrixSim::SysinfoNode& Node(uint32_t node) {
     const auto& nodes = BrixSim::RegisteredSysinfoNodes();
@@ -25,7 +26,7 @@ namespace KernCtl::Util {
 Sysinfo::Sysinfo(uint32_t node) : node_(node) {}
 
 void Sysinfo::Get(void* buffer, size_t size) {
-    BrixSim::Store::Get().Check("KernCtl::Util::Sysinfo::Get");
+    BrixSim::Store::Get().Check(kGet);
     const auto& node = Node(node_);
     if (!node.get) {
         throw HostCtl::Lib::HostCtlException("KSI node " + std::to_string(node_) +
@@ -35,7 +36,7 @@ void Sysinfo::Get(void* buffer, size_t size) {
 }
 
 void Sysinfo::List(std::vector<std::string>& names) {
-    BrixSim::Store::Get().Check("KernCtl::Util::Sysinfo::List");
+    BrixSim::Store::Get().Check(kList);
     const auto& node = Node(node_);
     if (!node.list) {
         throw HostCtl::Lib::HostCtlException("KSI node " + std::to_string(node_) +

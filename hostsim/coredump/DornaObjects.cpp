@@ -6,6 +6,7 @@
 #include <random>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -18,24 +19,25 @@ using BrixSim::Coredump::kMiB;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::DiagnosticDorna;
 
-constexpr const char* kCreate = "KernCtl::Storage::StorageInfoImpl::CreateDiagnosticDorna";
-constexpr const char* kAutoAdd = "KernCtl::Storage::StorageInfoImpl::AutoAddDiagnosticDorna";
-constexpr const char* kGetActive = "KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticDorna";
-constexpr const char* kGetConfigured =
-    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticDorna";
-constexpr const char* kGetPotential =
-    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticDornas";
-constexpr const char* kSet = "KernCtl::Storage::StorageInfoImpl::SetDiagnosticDorna";
-constexpr const char* kActivate = "KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticDorna";
-constexpr const char* kDeactivate = "KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticDorna";
-constexpr const char* kSmart = "KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticDorna";
-constexpr const char* kUnconfigure =
-    "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticDorna";
-constexpr const char* kReadCount = "KernCtl::Storage::StorageInfoImpl::GetDumpDornaReadCount";
-constexpr const char* kRemove = "KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove";
-constexpr const char* kGetUuid = "HostCtl::Storage::DiagnosticDorna::GetUuid";
-constexpr const char* kGetSize = "HostCtl::Storage::DiagnosticDorna::GetSize";
-constexpr const char* kIsValid = "HostCtl::Storage::DiagnosticDorna::IsValid";
+const BrixSim::Operation kCreate{"KernCtl::Storage::StorageInfoImpl::CreateDiagnosticDorna"};
+const BrixSim::Operation kAutoAdd{"KernCtl::Storage::StorageInfoImpl::AutoAddDiagnosticDorna"};
+const BrixSim::Operation kGetActive{"KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticDorna"};
+const BrixSim::Operation kGetConfigured{
+    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticDorna"};
+const BrixSim::Operation kGetPotential{
+    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticDornas"};
+const BrixSim::Operation kSet{"KernCtl::Storage::StorageInfoImpl::SetDiagnosticDorna"};
+const BrixSim::Operation kActivate{"KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticDorna"};
+const BrixSim::Operation kDeactivate{
+    "KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticDorna"};
+const BrixSim::Operation kSmart{"KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticDorna"};
+const BrixSim::Operation kUnconfigure{
+    "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticDorna"};
+const BrixSim::Operation kReadCount{"KernCtl::Storage::StorageInfoImpl::GetDumpDornaReadCount"};
+const BrixSim::Operation kRemove{"KernCtl::Storage::DiagnosticDornaImpl::DumpDornaRemove"};
+const BrixSim::Operation kGetUuid{"HostCtl::Storage::DiagnosticDorna::GetUuid"};
+const BrixSim::Operation kGetSize{"HostCtl::Storage::DiagnosticDorna::GetSize"};
+const BrixSim::Operation kIsValid{"HostCtl::Storage::DiagnosticDorna::IsValid"};
 
 // Kernel option that lets AutoAddDiagnosticDorna create an object (kept as a host setting).
 constexpr const char* kAutoCreateOption = "coredump.autoCreateDumpDorna";
@@ -43,9 +45,6 @@ constexpr const char* kAutoCreateOption = "coredump.autoCreateDumpDorna";
 constexpr const char* kCapacityKey = "coredump.dorna.capacity_mb";
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kCreate, kAutoAdd, kGetActive, kGetConfigured, kGetPotential, kSet,
-                                 kActivate, kDeactivate, kSmart, kUnconfigure, kReadCount, kRemove,
-                                 kGetUuid, kGetSize, kIsValid});
     return BrixSim::RegisterTables({
         "coredump.dorna",
         "CREATE TABLE IF NOT EXISTS coredump_dorna ("
@@ -144,7 +143,8 @@ std::unique_ptr<DiagnosticDorna> FromSetting(Store& store, const char* key) {
     return std::make_unique<KernCtl::Storage::DiagnosticDornaImpl>(uuid);
 }
 
-void CreateAndEnable(Store& store, const char* operation, uint64_t sizeMb, bool enable) {
+void CreateAndEnable(Store& store, const BrixSim::Operation& operation, uint64_t sizeMb,
+                     bool enable) {
     const std::string uuid = CreateObject(store, sizeMb);
     if (enable) {
         store.SetValue(kDornaKeys.configured, uuid);

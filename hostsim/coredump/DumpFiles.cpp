@@ -16,6 +16,7 @@
 #include "cmdkit/Text.h"
 #include "core/DurableWrite.h"
 #include "core/Fd.h"
+#include "core/Operation.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -33,22 +34,23 @@ using BrixSim::Coredump::kMiB;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::DiagnosticFile;
 
-constexpr const char* kCreate = "KernCtl::Storage::StorageInfoImpl::CreateDiagnosticFile";
-constexpr const char* kAutoAdd = "KernCtl::Storage::StorageInfoImpl::AutoAddDiagnosticFile";
-constexpr const char* kGetActive = "KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticFile";
-constexpr const char* kGetConfigured =
-    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticFile";
-constexpr const char* kGetPotential =
-    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticFiles";
-constexpr const char* kSet = "KernCtl::Storage::StorageInfoImpl::SetDiagnosticFile";
-constexpr const char* kActivate = "KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticFile";
-constexpr const char* kDeactivate = "KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticFile";
-constexpr const char* kSmart = "KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticFile";
-constexpr const char* kUnconfigure = "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticFile";
-constexpr const char* kReadCount = "KernCtl::Storage::StorageInfoImpl::GetDumpFileReadCount";
-constexpr const char* kGetPath = "HostCtl::Storage::DiagnosticFile::GetPath";
-constexpr const char* kGetSize = "HostCtl::Storage::DiagnosticFile::GetSize";
-constexpr const char* kIsValid = "HostCtl::Storage::DiagnosticFile::IsValid";
+const BrixSim::Operation kCreate{"KernCtl::Storage::StorageInfoImpl::CreateDiagnosticFile"};
+const BrixSim::Operation kAutoAdd{"KernCtl::Storage::StorageInfoImpl::AutoAddDiagnosticFile"};
+const BrixSim::Operation kGetActive{"KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticFile"};
+const BrixSim::Operation kGetConfigured{
+    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticFile"};
+const BrixSim::Operation kGetPotential{
+    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticFiles"};
+const BrixSim::Operation kSet{"KernCtl::Storage::StorageInfoImpl::SetDiagnosticFile"};
+const BrixSim::Operation kActivate{"KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticFile"};
+const BrixSim::Operation kDeactivate{"KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticFile"};
+const BrixSim::Operation kSmart{"KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticFile"};
+const BrixSim::Operation kUnconfigure{
+    "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticFile"};
+const BrixSim::Operation kReadCount{"KernCtl::Storage::StorageInfoImpl::GetDumpFileReadCount"};
+const BrixSim::Operation kGetPath{"HostCtl::Storage::DiagnosticFile::GetPath"};
+const BrixSim::Operation kGetSize{"HostCtl::Storage::DiagnosticFile::GetSize"};
+const BrixSim::Operation kIsValid{"HostCtl::Storage::DiagnosticFile::IsValid"};
 
 // The kernel option that lets AutoAddDiagnosticFile create a file. The option itself belongs
 // to the kernel's advanced options; the storage service reads its current value from here.
@@ -256,9 +258,6 @@ void WriteWithFile(Store& store, const std::function<void(std::string& created)>
 }
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kCreate, kAutoAdd, kGetActive, kGetConfigured, kGetPotential, kSet,
-                                 kActivate, kDeactivate, kSmart, kUnconfigure, kReadCount, kGetPath,
-                                 kGetSize, kIsValid});
     return BrixSim::RegisterTables({
         "coredump.files",
         "CREATE TABLE IF NOT EXISTS coredump_datastores ("

@@ -33,7 +33,7 @@ inline uint64_t DefaultDumpSizeMb(int64_t memoryMb) {
 
 // Runs `change` in one write transaction and journals the call in it.
 template <class Change>
-void Mutate(const char* operation, const std::vector<Value>& args, Change&& change) {
+void Mutate(const Operation& operation, const std::vector<Value>& args, Change&& change) {
     auto& store = Store::Get();
     store.Write([&] {
         change(store);

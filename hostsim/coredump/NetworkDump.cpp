@@ -13,6 +13,7 @@
 
 #include "cmdkit/Text.h"
 #include "core/Fd.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/Host.h"
 #include "hostctl/HostCtlException.h"
@@ -23,15 +24,15 @@ namespace {
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;
 
-constexpr const char* kGetNetworkInfo = "HostCtl::Host::GetNetworkInfo";
-constexpr const char* kGetConfig = "HostCtl::Network::NetworkInfo::GetNetworkDumpConfig";
-constexpr const char* kGetVnics = "HostCtl::Network::NetworkInfo::GetVirtualNics";
-constexpr const char* kSetIpv4 = "HostCtl::Network::NetworkInfo::SetNetworkDumpServerIpv4";
-constexpr const char* kSetIpv6 = "HostCtl::Network::NetworkInfo::SetNetworkDumpServerIpv6";
-constexpr const char* kEnable = "HostCtl::Network::NetworkInfo::EnableNetworkDump";
-constexpr const char* kDisable = "HostCtl::Network::NetworkInfo::DisableNetworkDump";
-constexpr const char* kIsEnabled = "HostCtl::Network::NetworkInfo::IsNetworkDumpEnabled";
-constexpr const char* kCheck = "HostCtl::Network::NetworkInfo::CheckNetworkDumpServer";
+const BrixSim::Operation kGetNetworkInfo{"HostCtl::Host::GetNetworkInfo"};
+const BrixSim::Operation kGetConfig{"HostCtl::Network::NetworkInfo::GetNetworkDumpConfig"};
+const BrixSim::Operation kGetVnics{"HostCtl::Network::NetworkInfo::GetVirtualNics"};
+const BrixSim::Operation kSetIpv4{"HostCtl::Network::NetworkInfo::SetNetworkDumpServerIpv4"};
+const BrixSim::Operation kSetIpv6{"HostCtl::Network::NetworkInfo::SetNetworkDumpServerIpv6"};
+const BrixSim::Operation kEnable{"HostCtl::Network::NetworkInfo::EnableNetworkDump"};
+const BrixSim::Operation kDisable{"HostCtl::Network::NetworkInfo::DisableNetworkDump"};
+const BrixSim::Operation kIsEnabled{"HostCtl::Network::NetworkInfo::IsNetworkDumpEnabled"};
+const BrixSim::Operation kCheck{"HostCtl::Network::NetworkInfo::CheckNetworkDumpServer"};
 
 constexpr const char* kEnabledKey = "coredump.netdump.enabled";
 constexpr const char* kInterfaceKey = "coredump.netdump.interface";
@@ -46,8 +47,6 @@ constexpr int kMaxCheckTimeoutMs = 1000;
 constexpr char kProbe[] = "BRIX-NETDUMP-PROBE 1\n";
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kGetNetworkInfo, kGetConfig, kGetVnics, kSetIpv4, kSetIpv6,
-                                 kEnable, kDisable, kIsEnabled, kCheck});
     return BrixSim::RegisterTables({
         "coredump.network",
         "CREATE TABLE IF NOT EXISTS coredump_vnics ("
@@ -94,8 +93,8 @@ bool HasVnic(Store& store, const std::string& name) {
 // The service keeps the port as a 32-bit number and the address as one of its family.
 constexpr int64_t kMaxPort = 4294967295;
 
-void SetServer(const char* operation, const std::string& interfaceName, const std::string& server,
-               int64_t port, bool ipv6) {
+void SetServer(const BrixSim::Operation& operation, const std::string& interfaceName,
+               const std::string& server, int64_t port, bool ipv6) {
     auto& store = Store::Get();
     store.Check(operation);
     if (ipv6 ? !HostCtl::Network::Ipv6Address::IsValidAddress(server)

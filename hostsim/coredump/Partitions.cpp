@@ -3,6 +3,7 @@
 #include <optional>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Storage.h"
@@ -14,28 +15,27 @@ using BrixSim::Coredump::kPartitionKeys;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::DiagnosticPartition;
 
-constexpr const char* kGetActive =
-    "KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticPartition";
-constexpr const char* kGetConfigured =
-    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticPartition";
-constexpr const char* kGetPotential =
-    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticPartitions";
-constexpr const char* kSet = "KernCtl::Storage::StorageInfoImpl::SetDiagnosticPartition";
-constexpr const char* kActivate = "KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticPartition";
-constexpr const char* kDeactivate =
-    "KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticPartition";
-constexpr const char* kSmart =
-    "KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticPartition";
-constexpr const char* kUnconfigure =
-    "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticPartition";
-constexpr const char* kGetName = "HostCtl::Storage::DiagnosticPartition::GetName";
-constexpr const char* kGetPath = "HostCtl::Storage::DiagnosticPartition::GetPath";
+const BrixSim::Operation kGetActive{
+    "KernCtl::Storage::StorageInfoImpl::GetActiveDiagnosticPartition"};
+const BrixSim::Operation kGetConfigured{
+    "KernCtl::Storage::StorageInfoImpl::GetConfiguredDiagnosticPartition"};
+const BrixSim::Operation kGetPotential{
+    "KernCtl::Storage::StorageInfoImpl::GetPotentialDiagnosticPartitions"};
+const BrixSim::Operation kSet{"KernCtl::Storage::StorageInfoImpl::SetDiagnosticPartition"};
+const BrixSim::Operation kActivate{
+    "KernCtl::Storage::StorageInfoImpl::ActivateDiagnosticPartition"};
+const BrixSim::Operation kDeactivate{
+    "KernCtl::Storage::StorageInfoImpl::DeactivateDiagnosticPartition"};
+const BrixSim::Operation kSmart{
+    "KernCtl::Storage::StorageInfoImpl::SmartActivateDiagnosticPartition"};
+const BrixSim::Operation kUnconfigure{
+    "KernCtl::Storage::StorageInfoImpl::UnconfigureDiagnosticPartition"};
+const BrixSim::Operation kGetName{"HostCtl::Storage::DiagnosticPartition::GetName"};
+const BrixSim::Operation kGetPath{"HostCtl::Storage::DiagnosticPartition::GetPath"};
 
 constexpr const char* kCoreDumpType = "coredump";
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kGetActive, kGetConfigured, kGetPotential, kSet, kActivate,
-                                 kDeactivate, kSmart, kUnconfigure, kGetName, kGetPath});
     return BrixSim::RegisterTables({
         "coredump.partitions",
         "CREATE TABLE IF NOT EXISTS coredump_disks ("

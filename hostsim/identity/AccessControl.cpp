@@ -4,25 +4,27 @@
 #include <string>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/KernAccess.h"
 
 namespace {
 
-constexpr const char* kOpen = "KernCtl::Security::KernAccessInterfaceImpl::KernAccessInterfaceImpl";
-constexpr const char* kGetKeywordsMap =
-    "KernCtl::Security::KernAccessInterfaceImpl::GetKeywordsMap";
-constexpr const char* kGetMaxDomains = "KernCtl::Security::KernAccessInterfaceImpl::GetMaxDomains";
-constexpr const char* kGetDomainInfo = "KernCtl::Security::KernAccessInterfaceImpl::GetDomainInfo";
-constexpr const char* kEnable = "KernCtl::Security::KernAccessInterfaceImpl::Enable";
-constexpr const char* kEnableDomain = "KernCtl::Security::KernAccessInterfaceImpl::EnableDomain";
+const BrixSim::Operation kOpen{
+    "KernCtl::Security::KernAccessInterfaceImpl::KernAccessInterfaceImpl"};
+const BrixSim::Operation kGetKeywordsMap{
+    "KernCtl::Security::KernAccessInterfaceImpl::GetKeywordsMap"};
+const BrixSim::Operation kGetMaxDomains{
+    "KernCtl::Security::KernAccessInterfaceImpl::GetMaxDomains"};
+const BrixSim::Operation kGetDomainInfo{
+    "KernCtl::Security::KernAccessInterfaceImpl::GetDomainInfo"};
+const BrixSim::Operation kEnable{"KernCtl::Security::KernAccessInterfaceImpl::Enable"};
+const BrixSim::Operation kEnableDomain{"KernCtl::Security::KernAccessInterfaceImpl::EnableDomain"};
 
 constexpr int64_t kDefaultMaxDomains = 16;
 
 const bool registered = [] {
-    BrixSim::RegisterOperations(
-        {kOpen, kGetKeywordsMap, kGetMaxDomains, kGetDomainInfo, kEnable, kEnableDomain});
     return BrixSim::RegisterTables({
         "secpolicy-keywords",
         "CREATE TABLE IF NOT EXISTS secpolicy_keywords ("

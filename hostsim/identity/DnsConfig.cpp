@@ -4,26 +4,25 @@
 
 #include <string_view>
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 
 namespace {
 
-constexpr const char* kOpen = "KernCtl::Network::DnsConfigImpl::DnsConfigImpl";
-constexpr const char* kGetHostname = "KernCtl::Network::DnsConfigImpl::GetHostname";
-constexpr const char* kGetDomain = "KernCtl::Network::DnsConfigImpl::GetDomain";
-constexpr const char* kGetFqdn = "KernCtl::Network::DnsConfigImpl::GetFqdn";
-constexpr const char* kSetHostname = "KernCtl::Network::DnsConfigImpl::SetHostname";
-constexpr const char* kSetDomain = "KernCtl::Network::DnsConfigImpl::SetDomain";
-constexpr const char* kSetFqdn = "KernCtl::Network::DnsConfigImpl::SetFqdn";
-constexpr const char* kSave = "KernCtl::Network::DnsConfigImpl::SaveConfig";
+const BrixSim::Operation kOpen{"KernCtl::Network::DnsConfigImpl::DnsConfigImpl"};
+const BrixSim::Operation kGetHostname{"KernCtl::Network::DnsConfigImpl::GetHostname"};
+const BrixSim::Operation kGetDomain{"KernCtl::Network::DnsConfigImpl::GetDomain"};
+const BrixSim::Operation kGetFqdn{"KernCtl::Network::DnsConfigImpl::GetFqdn"};
+const BrixSim::Operation kSetHostname{"KernCtl::Network::DnsConfigImpl::SetHostname"};
+const BrixSim::Operation kSetDomain{"KernCtl::Network::DnsConfigImpl::SetDomain"};
+const BrixSim::Operation kSetFqdn{"KernCtl::Network::DnsConfigImpl::SetFqdn"};
+const BrixSim::Operation kSave{"KernCtl::Network::DnsConfigImpl::SaveConfig"};
 
 constexpr size_t kMaxLabel = 63;
 constexpr size_t kMaxName = 253;
 
 const bool registered = [] {
-    BrixSim::RegisterOperations(
-        {kOpen, kGetHostname, kGetDomain, kGetFqdn, kSetHostname, kSetDomain, kSetFqdn, kSave});
     return BrixSim::RegisterTables({
         "dns",
         "CREATE TABLE IF NOT EXISTS dns_config ("

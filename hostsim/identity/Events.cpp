@@ -6,18 +6,17 @@
 #include <string>
 #include <string_view>
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "evt/EvtUser.h"
 
 namespace {
 
-constexpr const char* kInit = "EvtUserLib_Init";
-constexpr const char* kAddEvt = "EvtUserLib_AddEvt";
+const BrixSim::Operation kInit{"EvtUserLib_Init"};
+const BrixSim::Operation kAddEvt{"EvtUserLib_AddEvt"};
 
 // Marks the event identifier at the front of a format: "@&!*@*@(" identifier ")".
 constexpr std::string_view kIdOpen = "@&!*@*@(";
-
-const bool registered = BrixSim::RegisterOperations({kInit, kAddEvt});
 
 // Whether this process holds an open connection to the event service.
 bool connected = false;

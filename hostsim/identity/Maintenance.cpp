@@ -14,6 +14,7 @@
 
 #include "core/DurableWrite.h"
 #include "core/Hooks.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "identity/HostService.h"
@@ -23,13 +24,13 @@ namespace fs = std::filesystem;
 
 namespace {
 
-constexpr const char* kGetState = "KernCtl::System::SystemInfoImpl::GetMaintenanceModeState";
-constexpr const char* kGetCbrcRuntime = "KernCtl::System::SystemInfoImpl::GetCbrcRuntimeEnabled";
-constexpr const char* kGetCbrcConfigured =
-    "KernCtl::System::SystemInfoImpl::GetCbrcConfiguredEnabled";
-constexpr const char* kSetCbrc = "KernCtl::System::SystemInfoImpl::SetCbrcEnabled";
-constexpr const char* kEnter = "HostSvc::EnterMaintenanceMode";
-constexpr const char* kExit = "HostSvc::ExitMaintenanceMode";
+const BrixSim::Operation kGetState{"KernCtl::System::SystemInfoImpl::GetMaintenanceModeState"};
+const BrixSim::Operation kGetCbrcRuntime{"KernCtl::System::SystemInfoImpl::GetCbrcRuntimeEnabled"};
+const BrixSim::Operation kGetCbrcConfigured{
+    "KernCtl::System::SystemInfoImpl::GetCbrcConfiguredEnabled"};
+const BrixSim::Operation kSetCbrc{"KernCtl::System::SystemInfoImpl::SetCbrcEnabled"};
+const BrixSim::Operation kEnter{"HostSvc::EnterMaintenanceMode"};
+const BrixSim::Operation kExit{"HostSvc::ExitMaintenanceMode"};
 
 constexpr int kInMaintenance = 1;
 constexpr int kNotInMaintenance = 2;
@@ -98,8 +99,6 @@ const bool restarts = BrixSim::RegisterBootStep(
     [](BrixSim::Store& store) { store.Exec("UPDATE read_cache SET active = enabled_on_reboot"); });
 
 const bool registered = [] {
-    BrixSim::RegisterOperations(
-        {kGetState, kGetCbrcRuntime, kGetCbrcConfigured, kSetCbrc, kEnter, kExit});
     return BrixSim::RegisterTables({
         "maintenance",
         "CREATE TABLE IF NOT EXISTS maintenance_mode ("
@@ -125,7 +124,7 @@ int64_t ReadInt(const char* sql, int64_t fallback) {
 }
 
 // Moves the host into or out of maintenance mode; `dornaMode` is empty when leaving.
-void SetState(const char* operation, int state, int64_t timeoutSeconds,
+void SetState(const BrixSim::Operation& operation, int state, int64_t timeoutSeconds,
               const std::string& dornaMode) {
     auto& store = BrixSim::Store::Get();
     store.Write([&] {

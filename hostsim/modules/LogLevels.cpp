@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Module.h"
@@ -18,14 +19,13 @@ using HostCtl::Lib::HostCtlException;
 
 namespace {
 
-const bool registered = BrixSim::RegisterOperations({
-    "KernCtl::System::SystemInfoImpl::GetAllLogLevels",
-    "KernCtl::System::SystemInfoImpl::SetLogLevel",
-    "KernCtl::System::SystemInfoImpl::SetDefaultLogLevel",
-    "KernCtl::System::ModuleImpl::GetLogLevels",
-    "KernCtl::System::ModuleImpl::SetLogLevel",
-    "KernCtl::System::ModuleImpl::SetDefaultLogLevel",
-});
+const BrixSim::Operation kGetLogLevels{"KernCtl::System::ModuleImpl::GetLogLevels"};
+const BrixSim::Operation kSetDefaultLogLevel{"KernCtl::System::ModuleImpl::SetDefaultLogLevel"};
+const BrixSim::Operation kSetLogLevel{"KernCtl::System::ModuleImpl::SetLogLevel"};
+const BrixSim::Operation kGetAllLogLevels{"KernCtl::System::SystemInfoImpl::GetAllLogLevels"};
+const BrixSim::Operation kSystemInfoImplSetDefaultLogLevel{
+    "KernCtl::System::SystemInfoImpl::SetDefaultLogLevel"};
+const BrixSim::Operation kSystemInfoImplSetLogLevel{"KernCtl::System::SystemInfoImpl::SetLogLevel"};
 
 constexpr char kCore[] = "";
 
@@ -47,7 +47,7 @@ std::vector<HostCtl::System::LogLevel> ReadLevels(Store& store, const std::strin
 
 // Sets a level to `level`, or to its default when `level` is null. `who` names the owner in
 // messages and the journal.
-void WriteLevel(Store& store, const char* operation, const std::string& owner,
+void WriteLevel(Store& store, const BrixSim::Operation& operation, const std::string& owner,
                 const std::string& who, const std::string& name,
                 const std::optional<uint32_t>& level) {
     store.Write([&] {
@@ -89,41 +89,38 @@ namespace KernCtl::System {
 
 std::vector<HostCtl::System::LogLevel> SystemInfoImpl::GetAllLogLevels() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::GetAllLogLevels");
+    store.Check(kGetAllLogLevels);
     return ReadLevels(store, kCore);
 }
 
 void SystemInfoImpl::SetLogLevel(const std::string& name, uint32_t level) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::SetLogLevel");
-    WriteLevel(store, "KernCtl::System::SystemInfoImpl::SetLogLevel", kCore, "", name, level);
+    store.Check(kSystemInfoImplSetLogLevel);
+    WriteLevel(store, kSystemInfoImplSetLogLevel, kCore, "", name, level);
 }
 
 void SystemInfoImpl::SetDefaultLogLevel(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::SetDefaultLogLevel");
-    WriteLevel(store, "KernCtl::System::SystemInfoImpl::SetDefaultLogLevel", kCore, "", name,
-               std::nullopt);
+    store.Check(kSystemInfoImplSetDefaultLogLevel);
+    WriteLevel(store, kSystemInfoImplSetDefaultLogLevel, kCore, "", name, std::nullopt);
 }
 
 std::vector<HostCtl::System::LogLevel> ModuleImpl::GetLogLevels() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::GetLogLevels");
+    store.Check(kGetLogLevels);
     return ReadLevels(store, ModuleOwner(store, name_));
 }
 
 void ModuleImpl::SetLogLevel(const std::string& name, uint32_t level) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::SetLogLevel");
-    WriteLevel(store, "KernCtl::System::ModuleImpl::SetLogLevel", ModuleOwner(store, name_), name_,
-               name, level);
+    store.Check(kSetLogLevel);
+    WriteLevel(store, kSetLogLevel, ModuleOwner(store, name_), name_, name, level);
 }
 
 void ModuleImpl::SetDefaultLogLevel(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::SetDefaultLogLevel");
-    WriteLevel(store, "KernCtl::System::ModuleImpl::SetDefaultLogLevel", ModuleOwner(store, name_),
-               name_, name, std::nullopt);
+    store.Check(kSetDefaultLogLevel);
+    WriteLevel(store, kSetDefaultLogLevel, ModuleOwner(store, name_), name_, name, std::nullopt);
 }
 
 }  // namespace KernCtl::System

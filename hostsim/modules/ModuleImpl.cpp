@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
@@ -17,32 +18,32 @@ namespace Modules = BrixSim::Modules;
 
 namespace {
 
-const bool registered = BrixSim::RegisterOperations({
-    "KernCtl::System::ModuleImpl::IsValidName",
-    "KernCtl::System::ModuleImpl::GetName",
-    "KernCtl::System::ModuleImpl::IsLoaded",
-    "KernCtl::System::ModuleImpl::GetVersion",
-    "KernCtl::System::ModuleImpl::IsEnabled",
-    "KernCtl::System::ModuleImpl::GetProvidedNamespace",
-    "KernCtl::System::ModuleImpl::GetFileVersion",
-    "KernCtl::System::ModuleImpl::GetLicense",
-    "KernCtl::System::ModuleImpl::GetRequiredNamespaces",
-    "KernCtl::System::ModuleImpl::GetModuleFile",
-    "KernCtl::System::ModuleImpl::GetBuildType",
-    "KernCtl::System::ModuleImpl::GetContainingPackage",
-    "KernCtl::System::ModuleImpl::GetAcceptanceLevel",
-    "KernCtl::System::ModuleImpl::GetEnabled",
-    "KernCtl::System::ModuleImpl::SetEnabled",
-    "KernCtl::System::ModuleImpl::Load",
-    "KernCtl::System::ModuleImpl::GetParameters",
-    "KernCtl::System::ModuleImpl::GetOptions",
-    "KernCtl::System::ModuleImpl::SetParameterString",
-    "KernCtl::System::ModuleImpl::AppendParameterString",
-    "KernCtl::System::ModuleImpl::CopyParameters",
-    "KernCtl::System::SystemInfoImpl::GetModules",
-    "KernCtl::System::SystemInfoImpl::GetModuleByName",
-    "HostCtl::System::SystemInfo::GetModule",
-});
+const BrixSim::Operation kGetModule{"HostCtl::System::SystemInfo::GetModule"};
+const BrixSim::Operation kAppendParameterString{
+    "KernCtl::System::ModuleImpl::AppendParameterString"};
+const BrixSim::Operation kCopyParameters{"KernCtl::System::ModuleImpl::CopyParameters"};
+const BrixSim::Operation kGetAcceptanceLevel{"KernCtl::System::ModuleImpl::GetAcceptanceLevel"};
+const BrixSim::Operation kGetBuildType{"KernCtl::System::ModuleImpl::GetBuildType"};
+const BrixSim::Operation kGetContainingPackage{"KernCtl::System::ModuleImpl::GetContainingPackage"};
+const BrixSim::Operation kGetEnabled{"KernCtl::System::ModuleImpl::GetEnabled"};
+const BrixSim::Operation kGetFileVersion{"KernCtl::System::ModuleImpl::GetFileVersion"};
+const BrixSim::Operation kGetLicense{"KernCtl::System::ModuleImpl::GetLicense"};
+const BrixSim::Operation kGetModuleFile{"KernCtl::System::ModuleImpl::GetModuleFile"};
+const BrixSim::Operation kGetName{"KernCtl::System::ModuleImpl::GetName"};
+const BrixSim::Operation kGetOptions{"KernCtl::System::ModuleImpl::GetOptions"};
+const BrixSim::Operation kGetParameters{"KernCtl::System::ModuleImpl::GetParameters"};
+const BrixSim::Operation kGetProvidedNamespace{"KernCtl::System::ModuleImpl::GetProvidedNamespace"};
+const BrixSim::Operation kGetRequiredNamespaces{
+    "KernCtl::System::ModuleImpl::GetRequiredNamespaces"};
+const BrixSim::Operation kGetVersion{"KernCtl::System::ModuleImpl::GetVersion"};
+const BrixSim::Operation kIsEnabled{"KernCtl::System::ModuleImpl::IsEnabled"};
+const BrixSim::Operation kIsLoaded{"KernCtl::System::ModuleImpl::IsLoaded"};
+const BrixSim::Operation kIsValidName{"KernCtl::System::ModuleImpl::IsValidName"};
+const BrixSim::Operation kLoad{"KernCtl::System::ModuleImpl::Load"};
+const BrixSim::Operation kSetEnabled{"KernCtl::System::ModuleImpl::SetEnabled"};
+const BrixSim::Operation kSetParameterString{"KernCtl::System::ModuleImpl::SetParameterString"};
+const BrixSim::Operation kGetModuleByName{"KernCtl::System::SystemInfoImpl::GetModuleByName"};
+const BrixSim::Operation kGetModules{"KernCtl::System::SystemInfoImpl::GetModules"};
 
 HostCtlException NotFound(const std::string& name) {
     return HostCtlException("Module '" + CmdKit::MessageExcerpt(name) + "' not found");
@@ -120,48 +121,48 @@ const ModuleImpl::Record& ModuleImpl::Data() {
 
 bool ModuleImpl::IsValidName(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::IsValidName");
+    store.Check(kIsValidName);
     return Modules::IsModule(store, name);
 }
 
 std::string ModuleImpl::GetName() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetName");
+    Store::Get().Check(kGetName);
     return Data().name;
 }
 
 bool ModuleImpl::IsLoaded() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::IsLoaded");
+    Store::Get().Check(kIsLoaded);
     return Data().loaded;
 }
 
 std::string ModuleImpl::GetVersion() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetVersion");
+    Store::Get().Check(kGetVersion);
     return Data().version;
 }
 
 bool ModuleImpl::IsEnabled() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::IsEnabled");
+    Store::Get().Check(kIsEnabled);
     return Data().enabled;
 }
 
 HostCtl::System::ModuleNamespace ModuleImpl::GetProvidedNamespace() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetProvidedNamespace");
+    Store::Get().Check(kGetProvidedNamespace);
     return {Data().provides, Modules::SplitVersions(Data().providesVersions)};
 }
 
 std::string ModuleImpl::GetFileVersion() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetFileVersion");
+    Store::Get().Check(kGetFileVersion);
     return Data().fileVersion;
 }
 
 std::string ModuleImpl::GetLicense() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetLicense");
+    Store::Get().Check(kGetLicense);
     return Data().license;
 }
 
 std::vector<HostCtl::System::ModuleNamespace> ModuleImpl::GetRequiredNamespaces() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::GetRequiredNamespaces");
+    store.Check(kGetRequiredNamespaces);
     auto row = store.Prepare(
         "SELECT namespace, versions FROM module_requires WHERE module = ? ORDER BY seq");
     row.Bind(1, Data().name);
@@ -171,33 +172,33 @@ std::vector<HostCtl::System::ModuleNamespace> ModuleImpl::GetRequiredNamespaces(
 }
 
 std::string ModuleImpl::GetModuleFile() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetModuleFile");
+    Store::Get().Check(kGetModuleFile);
     return Data().file;
 }
 
 std::string ModuleImpl::GetBuildType() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetBuildType");
+    Store::Get().Check(kGetBuildType);
     return Data().buildType;
 }
 
 std::string ModuleImpl::GetContainingPackage() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetContainingPackage");
+    Store::Get().Check(kGetContainingPackage);
     return Data().package;
 }
 
 std::string ModuleImpl::GetAcceptanceLevel() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetAcceptanceLevel");
+    Store::Get().Check(kGetAcceptanceLevel);
     return Data().acceptance;
 }
 
 bool ModuleImpl::GetEnabled() {
-    Store::Get().Check("KernCtl::System::ModuleImpl::GetEnabled");
+    Store::Get().Check(kGetEnabled);
     return Data().enabled;
 }
 
 void ModuleImpl::SetEnabled(bool enabled) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::SetEnabled");
+    store.Check(kSetEnabled);
     store.Write([&] {
         const auto module = Modules::Resolve(store, name_);
         if (!module) throw NotFound(name_);
@@ -205,14 +206,14 @@ void ModuleImpl::SetEnabled(bool enabled) {
             .Bind(1, enabled)
             .Bind(2, *module)
             .Run();
-        store.JournalCall("KernCtl::System::ModuleImpl::SetEnabled", {name_, enabled});
+        store.JournalCall(kSetEnabled, {name_, enabled});
     });
     if (record_) record_->enabled = enabled;
 }
 
 void ModuleImpl::Load(const std::string& parameters, bool force) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::Load");
+    store.Check(kLoad);
     store.Write([&] {
         const auto module = Modules::Resolve(store, name_);
         const auto record = module ? FindRecord(store, *module) : nullptr;
@@ -240,14 +241,14 @@ void ModuleImpl::Load(const std::string& parameters, bool force) {
         Modules::ParseParameters(parameters.empty() ? ReadOptions(store, record->name)
                                                     : parameters);
         store.Prepare("UPDATE modules SET loaded = 1 WHERE name = ?").Bind(1, record->name).Run();
-        store.JournalCall("KernCtl::System::ModuleImpl::Load", {name_, parameters, force});
+        store.JournalCall(kLoad, {name_, parameters, force});
     });
     if (record_) record_->loaded = true;
 }
 
 std::vector<HostCtl::System::ModuleParam> ModuleImpl::GetParameters() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::GetParameters");
+    store.Check(kGetParameters);
     std::vector<HostCtl::System::ModuleParam> parameters;
     const auto module = Modules::Resolve(store, name_);
     if (!module) return parameters;
@@ -260,7 +261,7 @@ std::vector<HostCtl::System::ModuleParam> ModuleImpl::GetParameters() {
 
 std::map<std::string, std::string> ModuleImpl::GetOptions() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::GetOptions");
+    store.Check(kGetOptions);
     const auto owner = Modules::Resolve(store, name_).value_or(name_);
     std::map<std::string, std::string> options;
     for (const auto& pair : Modules::ParseParameters(ReadOptions(store, owner))) {
@@ -271,33 +272,31 @@ std::map<std::string, std::string> ModuleImpl::GetOptions() {
 
 void ModuleImpl::SetParameterString(const std::string& parameters, bool force) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::SetParameterString");
+    store.Check(kSetParameterString);
     const auto pairs = Modules::ParseParameters(parameters);
     store.Write([&] {
         WriteOptions(store, OptionsOwner(store, name_, force), Modules::JoinParameters(pairs));
-        store.JournalCall("KernCtl::System::ModuleImpl::SetParameterString",
-                          {name_, parameters, force});
+        store.JournalCall(kSetParameterString, {name_, parameters, force});
     });
 }
 
 void ModuleImpl::AppendParameterString(const std::string& parameters, bool force) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::AppendParameterString");
+    store.Check(kAppendParameterString);
     const auto added = Modules::ParseParameters(parameters);
     store.Write([&] {
         const auto owner = OptionsOwner(store, name_, force);
         auto pairs = Modules::ParseParameters(ReadOptions(store, owner));
         pairs.insert(pairs.end(), added.begin(), added.end());
         WriteOptions(store, owner, Modules::JoinParameters(pairs));
-        store.JournalCall("KernCtl::System::ModuleImpl::AppendParameterString",
-                          {name_, parameters, force});
+        store.JournalCall(kAppendParameterString, {name_, parameters, force});
     });
 }
 
 void ModuleImpl::CopyParameters(const std::string& source, const std::vector<std::string>& keys,
                                 bool force) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::ModuleImpl::CopyParameters");
+    store.Check(kCopyParameters);
     store.Write([&] {
         const auto target = Modules::Resolve(store, name_);
         if (!target) throw NotFound(name_);
@@ -325,14 +324,13 @@ void ModuleImpl::CopyParameters(const std::string& source, const std::vector<std
             }
         }
         WriteOptions(store, *target, Modules::JoinParameters(pairs));
-        store.JournalCall("KernCtl::System::ModuleImpl::CopyParameters",
-                          {source, name_, keys, force});
+        store.JournalCall(kCopyParameters, {source, name_, keys, force});
     });
 }
 
 std::vector<std::unique_ptr<HostCtl::System::Module>> SystemInfoImpl::GetModules() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::GetModules");
+    store.Check(kGetModules);
     auto row = store.Prepare(std::string("SELECT ") + Modules::kRecordColumns +
                              " FROM modules ORDER BY seq");
     std::vector<std::unique_ptr<HostCtl::System::Module>> modules;
@@ -342,7 +340,7 @@ std::vector<std::unique_ptr<HostCtl::System::Module>> SystemInfoImpl::GetModules
 
 std::unique_ptr<HostCtl::System::Module> SystemInfoImpl::GetModuleByName(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::GetModuleByName");
+    store.Check(kGetModuleByName);
     auto record = FindRecord(store, name);
     if (!record) return nullptr;
     return std::make_unique<ModuleImpl>(std::move(record));
@@ -353,7 +351,7 @@ std::unique_ptr<HostCtl::System::Module> SystemInfoImpl::GetModuleByName(const s
 namespace HostCtl::System {
 
 std::unique_ptr<Module> SystemInfo::GetModule(const std::string& name) {
-    BrixSim::Store::Get().Check("HostCtl::System::SystemInfo::GetModule");
+    BrixSim::Store::Get().Check(kGetModule);
     return std::make_unique<KernCtl::System::ModuleImpl>(name);
 }
 

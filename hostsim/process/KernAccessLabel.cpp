@@ -1,14 +1,14 @@
 // Labels of access-control security domains, from the host's domain table.
 #include <string>
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/KernAccess.h"
 
 namespace {
 
-const bool registered =
-    BrixSim::RegisterOperations({"KernCtl::Security::KernAccessInterfaceImpl::GetLabel"});
+const BrixSim::Operation kGetLabel{"KernCtl::Security::KernAccessInterfaceImpl::GetLabel"};
 
 }  // namespace
 
@@ -19,7 +19,7 @@ namespace KernCtl::Security {
 // listing still tells the domains apart.
 std::string KernAccessInterfaceImpl::GetLabel(uint32_t domain, int labelType) {
     auto& store = BrixSim::Store::Get();
-    store.Check("KernCtl::Security::KernAccessInterfaceImpl::GetLabel");
+    store.Check(kGetLabel);
     if (labelType != 0) {
         throw HostCtl::Lib::HostCtlException("Unsupported label type " + std::to_string(labelType));
     }

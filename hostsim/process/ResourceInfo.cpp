@@ -3,6 +3,7 @@
 #include <string>
 #include <utility>
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "kernctl/Resource.h"
 #include "kernctl/Sysinfo.h"
@@ -11,11 +12,10 @@
 
 namespace {
 
+const BrixSim::Operation kGetAllWorlds{"KernCtl::Resource::ResourceInfoImpl::GetAllWorlds"};
+
 namespace R = BrixSim::WorldRecord;
 using BrixSim::Ksi::ReadU32;
-
-const bool registered =
-    BrixSim::RegisterOperations({"KernCtl::Resource::ResourceInfoImpl::GetAllWorlds"});
 
 // The kernel's names for its world state and type codes; a code this library does not know
 // is shown with its number.
@@ -77,7 +77,7 @@ ResourceInfoImpl::~ResourceInfoImpl() = default;
 
 std::vector<std::unique_ptr<HostCtl::Resource::World>> ResourceInfoImpl::GetAllWorlds() {
     BrixSim::Store& store = BrixSim::Store::Get();
-    store.Check("KernCtl::Resource::ResourceInfoImpl::GetAllWorlds");
+    store.Check(kGetAllWorlds);
     // One read transaction for the listing and every record: one state of the host, and the
     // records come from the listing's pass over the table.
     std::vector<std::unique_ptr<HostCtl::Resource::World>> worlds;

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/Adv.h"
@@ -14,36 +15,47 @@ using HostCtl::Lib::HostCtlException;
 
 namespace {
 
-const bool registered = BrixSim::RegisterOperations({
-    "KernCtl::Adv::AdvancedOptionImpl::FindOption",
-    "KernCtl::Adv::AdvancedOptionImpl::GetPath",
-    "KernCtl::Adv::AdvancedOptionImpl::GetType",
-    "KernCtl::Adv::AdvancedOptionImpl::GetDescription",
-    "KernCtl::Adv::AdvancedOptionImpl::ResetToDefault",
-    "KernCtl::Adv::AdvancedOptionImpl::ClearOverride",
-    "KernCtl::Adv::AdvancedOptionImpl::ApplyChange",
-    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetDefault",
-    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetMin",
-    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetMax",
-    "KernCtl::Adv::AdvancedIntegerOptionImpl::GetValue",
-    "KernCtl::Adv::AdvancedIntegerOptionImpl::SetValue",
-    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetDefault",
-    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMin",
-    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMax",
-    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetValue",
-    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::SetValue",
-    "KernCtl::Adv::AdvancedStringOptionImpl::GetDefault",
-    "KernCtl::Adv::AdvancedStringOptionImpl::GetValidCharacters",
-    "KernCtl::Adv::AdvancedStringOptionImpl::GetValue",
-    "KernCtl::Adv::AdvancedStringOptionImpl::SetValue",
-    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetDefault",
-    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValidCharacters",
-    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValue",
-    "KernCtl::Adv::AdvancedUserStringOptionImpl::SetValue",
-    "KernCtl::Adv::AdvancedOptionBranchImpl::GetOptions",
-    "KernCtl::Adv::AdvancedOptionBranchImpl::GetBranches",
-    "KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch",
-});
+const BrixSim::Operation kGetDefault{"KernCtl::Adv::AdvancedIntegerOptionImpl::GetDefault"};
+const BrixSim::Operation kGetMax{"KernCtl::Adv::AdvancedIntegerOptionImpl::GetMax"};
+const BrixSim::Operation kGetMin{"KernCtl::Adv::AdvancedIntegerOptionImpl::GetMin"};
+const BrixSim::Operation kGetValue{"KernCtl::Adv::AdvancedIntegerOptionImpl::GetValue"};
+const BrixSim::Operation kSetValue{"KernCtl::Adv::AdvancedIntegerOptionImpl::SetValue"};
+const BrixSim::Operation kGetBranch{"KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch"};
+const BrixSim::Operation kGetBranches{"KernCtl::Adv::AdvancedOptionBranchImpl::GetBranches"};
+const BrixSim::Operation kGetOptions{"KernCtl::Adv::AdvancedOptionBranchImpl::GetOptions"};
+const BrixSim::Operation kApplyChange{"KernCtl::Adv::AdvancedOptionImpl::ApplyChange"};
+const BrixSim::Operation kClearOverride{"KernCtl::Adv::AdvancedOptionImpl::ClearOverride"};
+const BrixSim::Operation kFindOption{"KernCtl::Adv::AdvancedOptionImpl::FindOption"};
+const BrixSim::Operation kGetDescription{"KernCtl::Adv::AdvancedOptionImpl::GetDescription"};
+const BrixSim::Operation kGetPath{"KernCtl::Adv::AdvancedOptionImpl::GetPath"};
+const BrixSim::Operation kGetType{"KernCtl::Adv::AdvancedOptionImpl::GetType"};
+const BrixSim::Operation kResetToDefault{"KernCtl::Adv::AdvancedOptionImpl::ResetToDefault"};
+const BrixSim::Operation kAdvancedStringOptionImplGetDefault{
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetDefault"};
+const BrixSim::Operation kGetValidCharacters{
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetValidCharacters"};
+const BrixSim::Operation kAdvancedStringOptionImplGetValue{
+    "KernCtl::Adv::AdvancedStringOptionImpl::GetValue"};
+const BrixSim::Operation kAdvancedStringOptionImplSetValue{
+    "KernCtl::Adv::AdvancedStringOptionImpl::SetValue"};
+const BrixSim::Operation kAdvancedUserIntegerOptionImplGetDefault{
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetDefault"};
+const BrixSim::Operation kAdvancedUserIntegerOptionImplGetMax{
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMax"};
+const BrixSim::Operation kAdvancedUserIntegerOptionImplGetMin{
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetMin"};
+const BrixSim::Operation kAdvancedUserIntegerOptionImplGetValue{
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::GetValue"};
+const BrixSim::Operation kAdvancedUserIntegerOptionImplSetValue{
+    "KernCtl::Adv::AdvancedUserIntegerOptionImpl::SetValue"};
+const BrixSim::Operation kAdvancedUserStringOptionImplGetDefault{
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetDefault"};
+const BrixSim::Operation kAdvancedUserStringOptionImplGetValidCharacters{
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValidCharacters"};
+const BrixSim::Operation kAdvancedUserStringOptionImplGetValue{
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::GetValue"};
+const BrixSim::Operation kAdvancedUserStringOptionImplSetValue{
+    "KernCtl::Adv::AdvancedUserStringOptionImpl::SetValue"};
 
 // Other parts of the host read this option's value from the host settings.
 constexpr char kMirroredOption[] = "/Dump/autoCreateDumpFile";
@@ -53,8 +65,14 @@ constexpr char kColumns[] =
     "path, kind, type, description, int_value, int_default, int_min, int_max, str_value,"
     " str_default, valid_chars";
 
-void Check(const char* className, const char* operation) {
-    Store::Get().Check(std::string(className) + "::" + operation);
+// The operations of the option classes share their adapters: each is found by the name its
+// class and method make, which must be one defined above.
+const BrixSim::Operation& OperationOf(const char* className, const char* method) {
+    return BrixSim::Operation::Named(std::string(className) + "::" + method);
+}
+
+void Check(const char* className, const char* method) {
+    Store::Get().Check(OperationOf(className, method));
 }
 
 std::unique_ptr<KernCtl::Adv::AdvancedOptionImpl> MakeOption(const BrixSim::Stmt& row) {
@@ -95,7 +113,7 @@ const char* AdvancedOptionImpl::ClassName() const {
 
 std::unique_ptr<AdvancedOptionImpl> AdvancedOptionImpl::FindOption(const std::string& path) {
     auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionImpl::FindOption");
+    store.Check(kFindOption);
     auto row =
         store.Prepare(std::string("SELECT ") + kColumns + " FROM adv_options WHERE path = ?");
     row.Bind(1, path);
@@ -106,17 +124,17 @@ std::unique_ptr<AdvancedOptionImpl> AdvancedOptionImpl::FindOption(const std::st
 }
 
 std::string AdvancedOptionImpl::GetPath() {
-    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetPath");
+    Store::Get().Check(kGetPath);
     return data_.path;
 }
 
 int AdvancedOptionImpl::GetType() {
-    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetType");
+    Store::Get().Check(kGetType);
     return data_.type;
 }
 
 std::string AdvancedOptionImpl::GetDescription() {
-    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::GetDescription");
+    Store::Get().Check(kGetDescription);
     return data_.description;
 }
 
@@ -126,7 +144,7 @@ struct StagedOptionChange {
     std::optional<uint32_t> intValue;
     std::optional<std::string> stringValue;
     std::optional<bool> userSet;
-    std::vector<std::pair<std::string, std::vector<BrixSim::Value>>> calls;
+    std::vector<std::pair<const BrixSim::Operation*, std::vector<BrixSim::Value>>> calls;
 };
 
 StagedOptionChange& AdvancedOptionImpl::Staged() {
@@ -135,13 +153,13 @@ StagedOptionChange& AdvancedOptionImpl::Staged() {
 }
 
 void AdvancedOptionImpl::ResetToDefault() {
-    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::ResetToDefault");
+    Store::Get().Check(kResetToDefault);
     if (std::string(ClassName()) == "KernCtl::Adv::AdvancedOptionImpl") {
         throw HostCtlException("Unable to reset option " + data_.path,
                                "the option's value handler is not available");
     }
     auto& staged = Staged();
-    staged.calls.push_back({"KernCtl::Adv::AdvancedOptionImpl::ResetToDefault", {data_.path}});
+    staged.calls.push_back({&kResetToDefault, {data_.path}});
     staged.intValue = data_.intDefault;
     staged.stringValue = data_.stringDefault;
     data_.intValue = data_.intDefault;
@@ -149,15 +167,15 @@ void AdvancedOptionImpl::ResetToDefault() {
 }
 
 void AdvancedOptionImpl::ClearOverride() {
-    Store::Get().Check("KernCtl::Adv::AdvancedOptionImpl::ClearOverride");
+    Store::Get().Check(kClearOverride);
     auto& staged = Staged();
-    staged.calls.push_back({"KernCtl::Adv::AdvancedOptionImpl::ClearOverride", {data_.path}});
+    staged.calls.push_back({&kClearOverride, {data_.path}});
     staged.userSet = false;
 }
 
 void AdvancedOptionImpl::ApplyChange() {
     auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionImpl::ApplyChange");
+    store.Check(kApplyChange);
     store.Write([&] {
         if (staged_) {
             auto update = store.Prepare(
@@ -183,9 +201,10 @@ void AdvancedOptionImpl::ApplyChange() {
             if (staged_->intValue && data_.path == kMirroredOption) {
                 store.SetInt(kMirrorKey, *staged_->intValue);
             }
-            for (const auto& [operation, args] : staged_->calls) store.JournalCall(operation, args);
+            for (const auto& [operation, args] : staged_->calls)
+                store.JournalCall(*operation, args);
         }
-        store.JournalCall("KernCtl::Adv::AdvancedOptionImpl::ApplyChange", {data_.path});
+        store.JournalCall(kApplyChange, {data_.path});
     });
     staged_.reset();
 }
@@ -198,7 +217,7 @@ void AdvancedOptionImpl::StoreInteger(uint32_t value) {
                 std::to_string(data_.intMax));
     }
     auto& staged = Staged();
-    staged.calls.push_back({std::string(ClassName()) + "::SetValue", {data_.path, int64_t{value}}});
+    staged.calls.push_back({&OperationOf(ClassName(), "SetValue"), {data_.path, int64_t{value}}});
     staged.intValue = value;
     staged.userSet = true;
     data_.intValue = value;
@@ -214,7 +233,7 @@ void AdvancedOptionImpl::StoreString(const std::string& value) {
         }
     }
     auto& staged = Staged();
-    staged.calls.push_back({std::string(ClassName()) + "::SetValue", {data_.path, value}});
+    staged.calls.push_back({&OperationOf(ClassName(), "SetValue"), {data_.path, value}});
     staged.stringValue = value;
     staged.userSet = true;
     data_.stringValue = value;
@@ -332,7 +351,7 @@ AdvancedOptionBranchImpl::~AdvancedOptionBranchImpl() = default;
 
 std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOption>> AdvancedOptionBranchImpl::GetOptions() {
     auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetOptions");
+    store.Check(kGetOptions);
     auto row = store.Prepare(std::string("SELECT ") + kColumns +
                              " FROM adv_options WHERE branch = ? ORDER BY seq");
     row.Bind(1, path_);
@@ -344,7 +363,7 @@ std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOption>> AdvancedOptionBranchI
 std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>>
 AdvancedOptionBranchImpl::GetBranches() {
     auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetBranches");
+    store.Check(kGetBranches);
     auto row = store.Prepare("SELECT path FROM adv_branches WHERE parent = ? ORDER BY seq");
     row.Bind(1, path_);
     std::vector<std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch>> branches;
@@ -355,7 +374,7 @@ AdvancedOptionBranchImpl::GetBranches() {
 std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch> AdvancedOptionBranchImpl::GetBranch(
     const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::Adv::AdvancedOptionBranchImpl::GetBranch");
+    store.Check(kGetBranch);
     auto row = store.Prepare("SELECT path FROM adv_branches WHERE parent = ? AND name = ?");
     row.Bind(1, path_).Bind(2, name);
     if (!row.Step()) return nullptr;

@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "settings/Boot.h"
@@ -22,6 +23,15 @@ using HostCtl::Lib::HostCtlException;
 using Type = HostCtl::System::KernelOption::OptionType;
 
 namespace {
+
+const BrixSim::Operation kGetOption{"KernCtl::System::KernelOpts::GetOption"};
+const BrixSim::Operation kGetOptionDefault{"KernCtl::System::KernelOpts::GetOptionDefault"};
+const BrixSim::Operation kGetOptionDescription{"KernCtl::System::KernelOpts::GetOptionDescription"};
+const BrixSim::Operation kGetOptionNames{"KernCtl::System::KernelOpts::GetOptionNames"};
+const BrixSim::Operation kGetOptionType{"KernCtl::System::KernelOpts::GetOptionType"};
+const BrixSim::Operation kGetOptionTypeString{"KernCtl::System::KernelOpts::GetOptionTypeString"};
+const BrixSim::Operation kGetRuntimeValue{"KernCtl::System::KernelOpts::GetRuntimeValue"};
+const BrixSim::Operation kSetOption{"KernCtl::System::KernelOpts::SetOption"};
 
 struct SettingSeed {
     const char* name;
@@ -102,16 +112,6 @@ const SettingSeed kSettings[] = {
 };
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({
-        "KernCtl::System::KernelOpts::GetOptionNames",
-        "KernCtl::System::KernelOpts::GetOptionType",
-        "KernCtl::System::KernelOpts::GetOptionTypeString",
-        "KernCtl::System::KernelOpts::GetOptionDescription",
-        "KernCtl::System::KernelOpts::GetOption",
-        "KernCtl::System::KernelOpts::GetRuntimeValue",
-        "KernCtl::System::KernelOpts::GetOptionDefault",
-        "KernCtl::System::KernelOpts::SetOption",
-    });
     return BrixSim::RegisterTables({
         "kernelopts",
         // runtime_boot: the boot whose running kernel uses `runtime`; in any later boot the
@@ -234,7 +234,7 @@ KernelOpts::OptionInfo& KernelOpts::Find(const std::string& name) {
 }
 
 std::vector<std::string> KernelOpts::GetOptionNames() {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOptionNames");
+    Store::Get().Check(kGetOptionNames);
     Load();
     std::vector<std::string> names;
     names.reserve(options_.size());
@@ -243,32 +243,32 @@ std::vector<std::string> KernelOpts::GetOptionNames() {
 }
 
 HostCtl::System::KernelOption::OptionType KernelOpts::GetOptionType(const std::string& name) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOptionType");
+    Store::Get().Check(kGetOptionType);
     return Find(name).type;
 }
 
 std::string KernelOpts::GetOptionDescription(const std::string& name) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOptionDescription");
+    Store::Get().Check(kGetOptionDescription);
     return Find(name).description;
 }
 
 std::string KernelOpts::GetOption(const std::string& name) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOption");
+    Store::Get().Check(kGetOption);
     return Find(name).configured;
 }
 
 std::string KernelOpts::GetRuntimeValue(const std::string& name) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetRuntimeValue");
+    Store::Get().Check(kGetRuntimeValue);
     return Find(name).runtime;
 }
 
 std::string KernelOpts::GetOptionDefault(const std::string& name) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOptionDefault");
+    Store::Get().Check(kGetOptionDefault);
     return Find(name).defaultValue;
 }
 
 std::string KernelOpts::GetOptionTypeString(HostCtl::System::KernelOption::OptionType type) {
-    Store::Get().Check("KernCtl::System::KernelOpts::GetOptionTypeString");
+    Store::Get().Check(kGetOptionTypeString);
     switch (type) {
         case Type::OPTION_STRING:
             return "string";
@@ -288,7 +288,7 @@ std::string KernelOpts::GetOptionTypeString(HostCtl::System::KernelOption::Optio
 
 void KernelOpts::SetOption(const std::string& name, const std::string& value) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::KernelOpts::SetOption");
+    store.Check(kSetOption);
     store.Write([&] {
         loaded_ = false;  // read afresh inside the transaction
         options_.clear();
@@ -304,7 +304,7 @@ void KernelOpts::SetOption(const std::string& name, const std::string& value) {
             .Bind(3, stored)
             .Bind(4, info.name)
             .Run();
-        store.JournalCall("KernCtl::System::KernelOpts::SetOption", {info.name, stored});
+        store.JournalCall(kSetOption, {info.name, stored});
         info.configured = stored;
     });
 }

@@ -5,6 +5,7 @@
 
 #include "cmdkit/Text.h"
 #include "core/Hooks.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "kernctl/SystemInfoImpl.h"
@@ -12,6 +13,12 @@
 using BrixSim::Store;
 
 namespace {
+
+const BrixSim::Operation kGetKeyboardLayout{"KernCtl::System::SystemInfoImpl::GetKeyboardLayout"};
+const BrixSim::Operation kGetKeyboardLayouts{"KernCtl::System::SystemInfoImpl::GetKeyboardLayouts"};
+const BrixSim::Operation kLoadKeyboardMappings{
+    "KernCtl::System::SystemInfoImpl::LoadKeyboardMappings"};
+const BrixSim::Operation kSetKeyboardLayout{"KernCtl::System::SystemInfoImpl::SetKeyboardLayout"};
 
 constexpr char kStoredKey[] = "keyboard.layout";
 constexpr char kLoadedKey[] = "keyboard.loaded";
@@ -26,12 +33,6 @@ const char* const kLayouts[] = {
 };
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({
-        "KernCtl::System::SystemInfoImpl::GetKeyboardLayout",
-        "KernCtl::System::SystemInfoImpl::GetKeyboardLayouts",
-        "KernCtl::System::SystemInfoImpl::SetKeyboardLayout",
-        "KernCtl::System::SystemInfoImpl::LoadKeyboardMappings",
-    });
     return BrixSim::RegisterTables({
         "keyboard",
         "CREATE TABLE IF NOT EXISTS keyboard_layouts ("
@@ -73,13 +74,13 @@ namespace KernCtl::System {
 
 std::string SystemInfoImpl::GetKeyboardLayout() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::GetKeyboardLayout");
+    store.Check(kGetKeyboardLayout);
     return store.GetValue(kStoredKey, kDefaultLayout);
 }
 
 std::vector<std::string> SystemInfoImpl::GetKeyboardLayouts() {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::GetKeyboardLayouts");
+    store.Check(kGetKeyboardLayouts);
     auto row = store.Prepare("SELECT name FROM keyboard_layouts ORDER BY seq");
     std::vector<std::string> layouts;
     while (row.Step()) layouts.push_back(row.Text(0));
@@ -88,23 +89,23 @@ std::vector<std::string> SystemInfoImpl::GetKeyboardLayouts() {
 
 void SystemInfoImpl::SetKeyboardLayout(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::SetKeyboardLayout");
+    store.Check(kSetKeyboardLayout);
     store.Write([&] {
         const auto layout = Known(store, name);
         store.SetValue(kStoredKey, layout);
-        store.JournalCall("KernCtl::System::SystemInfoImpl::SetKeyboardLayout", {name});
+        store.JournalCall(kSetKeyboardLayout, {name});
     });
 }
 
 void SystemInfoImpl::LoadKeyboardMappings(const std::string& name) {
     auto& store = Store::Get();
-    store.Check("KernCtl::System::SystemInfoImpl::LoadKeyboardMappings");
+    store.Check(kLoadKeyboardMappings);
     store.Write([&] {
         // No name reloads the stored layout.
         const auto layout =
             name.empty() ? store.GetValue(kStoredKey, kDefaultLayout) : Known(store, name);
         store.SetValue(kLoadedKey, layout);
-        store.JournalCall("KernCtl::System::SystemInfoImpl::LoadKeyboardMappings", {name});
+        store.JournalCall(kLoadKeyboardMappings, {name});
     });
 }
 

@@ -4,17 +4,20 @@
 #include <string>
 #include <vector>
 
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/Misc.h"
 
 namespace {
-const bool registered = BrixSim::RegisterOperations({"HostCtl::Misc::StringTokenize"});
+
+const BrixSim::Operation kStringTokenize{"HostCtl::Misc::StringTokenize"};
+
 }
 
 namespace HostCtl::Misc {
 
 std::vector<std::string> StringTokenize(const std::string& text, const std::string& delimiters) {
-    BrixSim::Store::Get().Check("HostCtl::Misc::StringTokenize");
+    BrixSim::Store::Get().Check(kStringTokenize);
     std::vector<std::string> pieces;
     boost::algorithm::split(pieces, text, boost::algorithm::is_any_of(delimiters),
                             boost::algorithm::token_compress_on);

@@ -5,9 +5,12 @@
 #include <chrono>
 
 #include "core/Hooks.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 
 namespace {
+
+const BrixSim::Operation kFetchAllStats{"HostCtl::AdvStats::ServerStats::FetchAllStats"};
 
 // Uptime is measured on the real clock, so setting the host's time does not move it.
 int64_t RealNowMicros() {
@@ -17,7 +20,6 @@ int64_t RealNowMicros() {
 }
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({"HostCtl::AdvStats::ServerStats::FetchAllStats"});
     return BrixSim::RegisterTables({
         "stats",
         "CREATE TABLE IF NOT EXISTS server_stats ("
@@ -49,7 +51,7 @@ ServerStats::~ServerStats() = default;
 
 void ServerStats::FetchAllStats() {
     auto& store = BrixSim::Store::Get();
-    store.Check("HostCtl::AdvStats::ServerStats::FetchAllStats");
+    store.Check(kFetchAllStats);
     auto row = store.Prepare(
         "SELECT boot_time_us, running, load_count, load1, load5, load15 FROM server_stats");
     if (!row.Step()) return;

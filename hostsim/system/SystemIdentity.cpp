@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "core/Hooks.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
@@ -14,14 +15,14 @@ namespace {
 
 using BrixSim::Store;
 
-constexpr const char* kGetSystemUuid = "KernCtl::System::SystemInfoImpl::GetSystemUuid";
-constexpr const char* kGetBootNic = "KernCtl::System::SystemInfoImpl::GetBootNicMacAddress";
-constexpr const char* kGetBootFs = "KernCtl::System::SystemInfoImpl::GetBootFsUUID";
-constexpr const char* kGetStatelessNic =
-    "KernCtl::System::SystemInfoImpl::GetStatelessBootNicMacAddress";
-constexpr const char* kGetWelcome = "KernCtl::System::SystemInfoImpl::GetWelcomeMessage";
-constexpr const char* kSetWelcome = "KernCtl::System::SystemInfoImpl::SetWelcomeMessage";
-constexpr const char* kGetInception = "HostCtl::System::SystemInfo::GetInceptionTime";
+const BrixSim::Operation kGetSystemUuid{"KernCtl::System::SystemInfoImpl::GetSystemUuid"};
+const BrixSim::Operation kGetBootNic{"KernCtl::System::SystemInfoImpl::GetBootNicMacAddress"};
+const BrixSim::Operation kGetBootFs{"KernCtl::System::SystemInfoImpl::GetBootFsUUID"};
+const BrixSim::Operation kGetStatelessNic{
+    "KernCtl::System::SystemInfoImpl::GetStatelessBootNicMacAddress"};
+const BrixSim::Operation kGetWelcome{"KernCtl::System::SystemInfoImpl::GetWelcomeMessage"};
+const BrixSim::Operation kSetWelcome{"KernCtl::System::SystemInfoImpl::SetWelcomeMessage"};
+const BrixSim::Operation kGetInception{"HostCtl::System::SystemInfo::GetInceptionTime"};
 
 // The system-version record: NUL-terminated text fields at fixed offsets.
 struct VersionField {
@@ -65,13 +66,11 @@ void GetVersionRecord(const std::vector<std::string>&, void* buffer, size_t size
 }
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kGetSystemUuid, kGetBootNic, kGetBootFs, kGetStatelessNic,
-                                 kGetWelcome, kSetWelcome, kGetInception});
     BrixSim::RegisterSysinfoNode(KSI_NODE_system_version, {GetVersionRecord, nullptr});
     return BrixSim::RegisterTables({"identity", "", SeedIdentity});
 }();
 
-std::string Read(const char* operation, const char* key) {
+std::string Read(const BrixSim::Operation& operation, const char* key) {
     auto& store = Store::Get();
     store.Check(operation);
     return store.GetValue(key, "");
@@ -84,17 +83,25 @@ namespace KernCtl::System {
 SystemInfoImpl::SystemInfoImpl() = default;
 SystemInfoImpl::~SystemInfoImpl() = default;
 
-std::string SystemInfoImpl::GetSystemUuid() { return Read(kGetSystemUuid, "system.uuid"); }
+std::string SystemInfoImpl::GetSystemUuid() {
+    return Read(kGetSystemUuid, "system.uuid");
+}
 
-std::string SystemInfoImpl::GetBootNicMacAddress() { return Read(kGetBootNic, "system.boot_nic"); }
+std::string SystemInfoImpl::GetBootNicMacAddress() {
+    return Read(kGetBootNic, "system.boot_nic");
+}
 
-std::string SystemInfoImpl::GetBootFsUUID() { return Read(kGetBootFs, "system.boot_fs_uuid"); }
+std::string SystemInfoImpl::GetBootFsUUID() {
+    return Read(kGetBootFs, "system.boot_fs_uuid");
+}
 
 std::string SystemInfoImpl::GetStatelessBootNicMacAddress() {
     return Read(kGetStatelessNic, "system.stateless_boot_nic");
 }
 
-std::string SystemInfoImpl::GetWelcomeMessage() { return Read(kGetWelcome, "system.welcome"); }
+std::string SystemInfoImpl::GetWelcomeMessage() {
+    return Read(kGetWelcome, "system.welcome");
+}
 
 void SystemInfoImpl::SetWelcomeMessage(const std::string& text) {
     auto& store = Store::Get();
@@ -109,6 +116,8 @@ void SystemInfoImpl::SetWelcomeMessage(const std::string& text) {
 
 namespace HostCtl::System {
 
-std::string SystemInfo::GetInceptionTime() { return Read(kGetInception, "system.inception"); }
+std::string SystemInfo::GetInceptionTime() {
+    return Read(kGetInception, "system.inception");
+}
 
 }  // namespace HostCtl::System

@@ -89,11 +89,13 @@ TEST(Brixsim, FaultsAreArmedCountedAndCleared) {
               "\"remaining\":null}\n");
     // Arming again replaces the fault.
     ASSERT_EQ(host.Sim({"fault", "set", op, "Gone"}).status, 0);
-    EXPECT_THROW(Store::Get().Check(op), std::exception);
-    EXPECT_THROW(Store::Get().Check(op), std::exception);  // until cleared
+    EXPECT_THROW(Store::Get().Check(BrixSim::Operation::Named(op)), std::exception);
+    EXPECT_THROW(Store::Get().Check(BrixSim::Operation::Named(op)),
+                 std::exception);  // until cleared
     ASSERT_EQ(host.Sim({"fault", "clear", op}).status, 0);
-    EXPECT_NO_THROW(Store::Get().Check(op));
-    EXPECT_THROW(Store::Get().Check("KernCtl::Util::Sysinfo::List"), std::exception);
+    EXPECT_NO_THROW(Store::Get().Check(BrixSim::Operation::Named(op)));
+    EXPECT_THROW(Store::Get().Check(BrixSim::Operation::Named("KernCtl::Util::Sysinfo::List")),
+                 std::exception);
     ASSERT_EQ(host.Sim({"fault", "clear"}).status, 0);
     EXPECT_EQ(host.Sim({"fault", "list"}).out, "");
     // Faults arm nothing in the journal.

@@ -92,18 +92,19 @@ TEST(StoreRead, FaultsAreReadOncePerTransactionAndFiredOnesCount) {
     auto& store = Store::Get();
     const std::string op = "HostCtl::HostFactory::GetHost";
     store.Read([&] {
-        EXPECT_NO_THROW(store.Check(op));
+        EXPECT_NO_THROW(store.Check(BrixSim::Operation::Named(op)));
         WriteElsewhere(host, "INSERT INTO faults VALUES ('" + op + "', 'Gone', NULL, NULL)");
-        EXPECT_NO_THROW(store.Check(op));  // armed after this transaction began
+        EXPECT_NO_THROW(
+            store.Check(BrixSim::Operation::Named(op)));  // armed after this transaction began
     });
-    EXPECT_THROW(store.Check(op), HostCtl::Lib::HostCtlException);
+    EXPECT_THROW(store.Check(BrixSim::Operation::Named(op)), HostCtl::Lib::HostCtlException);
 
     host.Fault(op, "Twice", 2);
     int fired = 0;
     store.Read([&] {
         for (int call = 0; call < 4; ++call) {
             try {
-                store.Check(op);
+                store.Check(BrixSim::Operation::Named(op));
             } catch (const HostCtl::Lib::HostCtlException& e) {
                 EXPECT_EQ(std::string(e.what()), "Twice");
                 ++fired;
@@ -116,13 +117,13 @@ TEST(StoreRead, FaultsAreReadOncePerTransactionAndFiredOnesCount) {
 
 // Records the read transaction it executes in.
 class SnapshotCommand : public virtual CmdKit::AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<SnapshotCommand> Make() {
         return AdoptSelf(std::shared_ptr<SnapshotCommand>(new SnapshotCommand));
     }
     uint64_t seen = 0;
 
-protected:
+  protected:
     std::shared_ptr<CmdKit::CallSpec::InputSpec> GetInputSpecInternal() override {
         return CmdKit::CallSpec::InputSpec::New();
     }
@@ -135,7 +136,7 @@ protected:
         output->SetComplete();
     }
 
-private:
+  private:
     SnapshotCommand() = default;
 };
 

@@ -14,6 +14,9 @@
 
 namespace {
 
+// An operation of the tests' own.
+const BrixSim::Operation kSetThing{"Area::SetThing"};
+
 using BrixSim::Store;
 using BrixTest::TempHost;
 
@@ -80,8 +83,8 @@ TEST(Store, JournalKeepsOrderAndFieldOrder) {
     TempHost host;
     auto& store = Store::Get();
     store.Write([&] {
-        store.JournalCall("Area::SetThing", {std::string("name"), int64_t{-3}, true, nullptr,
-                                             std::vector<std::string>{"a", "b"}});
+        store.JournalCall(kSetThing, {std::string("name"), int64_t{-3}, true, nullptr,
+                                      std::vector<std::string>{"a", "b"}});
         store.Journal("event", {{"format", "evt.%s"}, {"text", "evt.x"}});
     });
     store.Journal("sleep", {{"seconds", int64_t{2}}});
@@ -102,18 +105,18 @@ TEST(Store, JournalKeepsOrderAndFieldOrder) {
 TEST(Store, CheckThrowsArmedFaultsWithDetail) {
     TempHost host;
     auto& store = Store::Get();
-    EXPECT_NO_THROW(store.Check("HostCtl::HostFactory::GetHost"));
+    EXPECT_NO_THROW(store.Check(BrixSim::Operation::Named("HostCtl::HostFactory::GetHost")));
     host.Fault("HostCtl::HostFactory::GetHost", "Host is unreachable", 2, "timed out");
     for (int call = 0; call < 2; ++call) {
         try {
-            store.Check("HostCtl::HostFactory::GetHost");
+            store.Check(BrixSim::Operation::Named("HostCtl::HostFactory::GetHost"));
             FAIL() << "no fault on call " << call;
         } catch (const HostCtl::Lib::HostCtlException& e) {
             EXPECT_STREQ(e.what(), "Host is unreachable");
             EXPECT_EQ(e.GetDetailedMessage(), "Host is unreachable (timed out)");
         }
     }
-    EXPECT_NO_THROW(store.Check("HostCtl::HostFactory::GetHost"));
+    EXPECT_NO_THROW(store.Check(BrixSim::Operation::Named("HostCtl::HostFactory::GetHost")));
     EXPECT_EQ(host.Sim({"fault", "list"}).out, "");
 }
 
@@ -124,11 +127,12 @@ TEST(Store, CountedFaultFiringInsideARolledBackWriteStillCounts) {
     for (int call = 0; call < 2; ++call) {
         EXPECT_THROW(store.Write([&] {
             store.SetValue("k", "v");
-            store.Check("KernCtl::Util::Sysinfo::Get");
+            store.Check(BrixSim::Operation::Named("KernCtl::Util::Sysinfo::Get"));
         }),
                      HostCtl::Lib::HostCtlException);
     }
-    EXPECT_NO_THROW(store.Write([&] { store.Check("KernCtl::Util::Sysinfo::Get"); }));
+    EXPECT_NO_THROW(store.Write(
+        [&] { store.Check(BrixSim::Operation::Named("KernCtl::Util::Sysinfo::Get")); }));
     EXPECT_FALSE(store.GetValue("k").has_value());
 }
 

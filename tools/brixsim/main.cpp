@@ -183,7 +183,7 @@ int FaultSet(const Args& args) {
         }
     }
     if (positional.size() != 2) throw UsageError("fault set: needs OPERATION and MESSAGE");
-    const auto operations = BrixSim::RegisteredOperations();
+    const auto operations = BrixSim::Operation::All();
     if (!std::binary_search(operations.begin(), operations.end(), positional[0])) {
         std::cerr << "brixsim: unknown operation " << positional[0]
                   << " (brixsim fault ops lists them)\n";
@@ -240,7 +240,7 @@ int Fault(const Args& args) {
     }
     if (args[0] == "ops") {
         if (!rest.empty()) throw UsageError("fault ops: takes no arguments");
-        for (const auto& operation : BrixSim::RegisteredOperations()) {
+        for (const auto& operation : BrixSim::Operation::All()) {
             std::cout << operation << "\n";
         }
         return 0;

@@ -32,6 +32,7 @@
 #include "agents/slp/SlpWire.h"
 #include "cmdkit/Text.h"
 #include "core/Fd.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 
@@ -44,14 +45,14 @@ using HostCtl::System::SLPSvc;
 using Clock = std::chrono::steady_clock;
 using namespace BrixSim::Slp;
 
-constexpr const char* kFactory = "HostCtl::System::SlpAgentFactory";
-constexpr const char* kSearch = "HostCtl::System::SlpAgent::Search";
-constexpr const char* kSearchNode = "HostCtl::System::SlpAgent::SearchNode";
-constexpr const char* kResetSearch = "HostCtl::System::SlpAgent::ResetSearch";
-constexpr const char* kSetSearchPort = "HostCtl::System::SlpAgent::SetSearchPort";
-constexpr const char* kSetSearchService = "HostCtl::System::SlpAgent::SetSearchService";
-constexpr const char* kSetSearchTcp = "HostCtl::System::SlpAgent::SetSearchTcp";
-constexpr const char* kGetStats = "HostCtl::System::SlpAgent::GetStats";
+const BrixSim::Operation kFactory{"HostCtl::System::SlpAgentFactory"};
+const BrixSim::Operation kSearch{"HostCtl::System::SlpAgent::Search"};
+const BrixSim::Operation kSearchNode{"HostCtl::System::SlpAgent::SearchNode"};
+const BrixSim::Operation kResetSearch{"HostCtl::System::SlpAgent::ResetSearch"};
+const BrixSim::Operation kSetSearchPort{"HostCtl::System::SlpAgent::SetSearchPort"};
+const BrixSim::Operation kSetSearchService{"HostCtl::System::SlpAgent::SetSearchService"};
+const BrixSim::Operation kSetSearchTcp{"HostCtl::System::SlpAgent::SetSearchTcp"};
+const BrixSim::Operation kGetStats{"HostCtl::System::SlpAgent::GetStats"};
 
 constexpr const char* kDefaultService = "service-agent";
 constexpr int64_t kDefaultWaitMs = 1500;
@@ -62,8 +63,6 @@ constexpr int64_t kMaxWaitMs = 60'000;
 constexpr uint32_t kMaxTcpReply = 1 << 20;
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kFactory, kSearch, kSearchNode, kResetSearch, kSetSearchPort,
-                                 kSetSearchService, kSetSearchTcp, kGetStats});
     // The user agent's settings, written out so that an exported host shows them.
     return BrixSim::RegisterTables({"slp-ua", "", [](Store& store) {
                                         store.SetValue("slp.ua.interface", kLoopback);

@@ -21,6 +21,7 @@
 #include "agents/snmp/UsmKeys.h"
 #include "core/DurableWrite.h"
 #include "core/Hooks.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SnmpAgent.h"
@@ -39,33 +40,32 @@ constexpr const char* kNotValid =
     "The SNMP agent configuration /etc/ostrel/snmp.xml is not valid xml: repair it, or replace "
     "it with 'system snmp set --reset'.";
 
-#define SNMP_OP(name) "HostCtl::System::SnmpAgentConfig::" name
-constexpr const char* kFactory = "HostCtl::System::SnmpAgentConfigFactory";
-constexpr const char* kCommit = SNMP_OP("Commit");
-constexpr const char* kIsEnabled = SNMP_OP("IsEnabled");
-constexpr const char* kSetEnabled = SNMP_OP("SetEnabled");
-constexpr const char* kGetPort = SNMP_OP("GetPort");
-constexpr const char* kSetPort = SNMP_OP("SetPort");
-constexpr const char* kGetCommunities = SNMP_OP("GetCommunities");
-constexpr const char* kSetCommunities = SNMP_OP("SetCommunities");
-constexpr const char* kGetTargets = SNMP_OP("GetTargets");
-constexpr const char* kSetTargets = SNMP_OP("SetTargets");
-constexpr const char* kGetOptions = SNMP_OP("GetOptions");
-constexpr const char* kSetOptions = SNMP_OP("SetOptions");
-constexpr const char* kResetToDefaults = SNMP_OP("ResetToDefaults");
-constexpr const char* kSendWarmStart = SNMP_OP("SendWarmStart");
-constexpr const char* kTestUser = SNMP_OP("TestUser");
-constexpr const char* kGenerateLocalizedHashes = SNMP_OP("GenerateLocalizedHashes");
-constexpr const char* kGetV3Targets = SNMP_OP("GetV3Targets");
-constexpr const char* kLoad = SNMP_OP("Load");
-constexpr const char* kGetUsers = SNMP_OP("GetUsers");
-constexpr const char* kSetUsers = SNMP_OP("SetUsers");
-constexpr const char* kGetRemoteUsers = SNMP_OP("GetRemoteUsers");
-constexpr const char* kSetRemoteUsers = SNMP_OP("SetRemoteUsers");
-constexpr const char* kGetLargeStorage = SNMP_OP("GetLargeStorage");
-constexpr const char* kSetLargeStorage = SNMP_OP("SetLargeStorage");
-constexpr const char* kSetV3Targets = SNMP_OP("SetV3Targets");
-#undef SNMP_OP
+const BrixSim::Operation kFactory{"HostCtl::System::SnmpAgentConfigFactory"};
+const BrixSim::Operation kCommit{"HostCtl::System::SnmpAgentConfig::Commit"};
+const BrixSim::Operation kIsEnabled{"HostCtl::System::SnmpAgentConfig::IsEnabled"};
+const BrixSim::Operation kSetEnabled{"HostCtl::System::SnmpAgentConfig::SetEnabled"};
+const BrixSim::Operation kGetPort{"HostCtl::System::SnmpAgentConfig::GetPort"};
+const BrixSim::Operation kSetPort{"HostCtl::System::SnmpAgentConfig::SetPort"};
+const BrixSim::Operation kGetCommunities{"HostCtl::System::SnmpAgentConfig::GetCommunities"};
+const BrixSim::Operation kSetCommunities{"HostCtl::System::SnmpAgentConfig::SetCommunities"};
+const BrixSim::Operation kGetTargets{"HostCtl::System::SnmpAgentConfig::GetTargets"};
+const BrixSim::Operation kSetTargets{"HostCtl::System::SnmpAgentConfig::SetTargets"};
+const BrixSim::Operation kGetOptions{"HostCtl::System::SnmpAgentConfig::GetOptions"};
+const BrixSim::Operation kSetOptions{"HostCtl::System::SnmpAgentConfig::SetOptions"};
+const BrixSim::Operation kResetToDefaults{"HostCtl::System::SnmpAgentConfig::ResetToDefaults"};
+const BrixSim::Operation kSendWarmStart{"HostCtl::System::SnmpAgentConfig::SendWarmStart"};
+const BrixSim::Operation kTestUser{"HostCtl::System::SnmpAgentConfig::TestUser"};
+const BrixSim::Operation kGenerateLocalizedHashes{
+    "HostCtl::System::SnmpAgentConfig::GenerateLocalizedHashes"};
+const BrixSim::Operation kGetV3Targets{"HostCtl::System::SnmpAgentConfig::GetV3Targets"};
+const BrixSim::Operation kLoad{"HostCtl::System::SnmpAgentConfig::Load"};
+const BrixSim::Operation kGetUsers{"HostCtl::System::SnmpAgentConfig::GetUsers"};
+const BrixSim::Operation kSetUsers{"HostCtl::System::SnmpAgentConfig::SetUsers"};
+const BrixSim::Operation kGetRemoteUsers{"HostCtl::System::SnmpAgentConfig::GetRemoteUsers"};
+const BrixSim::Operation kSetRemoteUsers{"HostCtl::System::SnmpAgentConfig::SetRemoteUsers"};
+const BrixSim::Operation kGetLargeStorage{"HostCtl::System::SnmpAgentConfig::GetLargeStorage"};
+const BrixSim::Operation kSetLargeStorage{"HostCtl::System::SnmpAgentConfig::SetLargeStorage"};
+const BrixSim::Operation kSetV3Targets{"HostCtl::System::SnmpAgentConfig::SetV3Targets"};
 
 // The engine id of an agent without a stored one: RFC 3411 text format under the vendor's
 // enterprise number (47077), the text being the tail of the host's UUID, so that the whole id
@@ -439,13 +439,13 @@ class AgentConfig final : public HostCtl::System::SnmpAgentConfig {
     }
 
   private:
-    static Store& Begin(const char* operation) {
+    static Store& Begin(const BrixSim::Operation& operation) {
         auto& store = Store::Get();
         store.Check(operation);
         return store;
     }
     // As Begin, for an operation that needs readable stored settings.
-    Store& Read(const char* operation) {
+    Store& Read(const BrixSim::Operation& operation) {
         auto& store = Begin(operation);
         if (!valid_ && !reset_) throw HostCtlException(kNotValid);
         return store;
@@ -563,14 +563,6 @@ void Seed(Store& store) {
 }
 
 const bool registered = [] {
-    BrixSim::RegisterOperations(
-        {kFactory,         kCommit,         kIsEnabled,       kSetEnabled,
-         kGetPort,         kSetPort,        kGetCommunities,  kSetCommunities,
-         kGetTargets,      kSetTargets,     kGetOptions,      kSetOptions,
-         kResetToDefaults, kSendWarmStart,  kTestUser,        kGenerateLocalizedHashes,
-         kGetV3Targets,    kLoad,           kGetUsers,        kSetUsers,
-         kGetRemoteUsers,  kSetRemoteUsers, kGetLargeStorage, kSetLargeStorage,
-         kSetV3Targets});
     BrixSim::RegisterHeldFile(kBootPath, HoldBootReset);
     return BrixSim::RegisterTables({"snmp", "", Seed});
 }();

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
+#include "core/Operation.h"
 #include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
@@ -20,21 +21,22 @@ using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::System::ProviderInfo;
 
-constexpr const char* kGetConfig = "HostCtl::System::SystemInfo::GetWbemAgentConfig";
-constexpr const char* kCommit = "HostCtl::System::WbemAgentConfig::Commit";
-constexpr const char* kIsEnabled = "HostCtl::System::WbemAgentConfig::IsEnabled";
-constexpr const char* kIsWsManEnabled = "HostCtl::System::WbemAgentConfig::IsWsManEnabled";
-constexpr const char* kSetEnabled = "HostCtl::System::WbemAgentConfig::SetEnabled";
-constexpr const char* kSetWsManEnabled = "HostCtl::System::WbemAgentConfig::SetWsManEnabled";
-constexpr const char* kSetProviderEnabled = "HostCtl::System::WbemAgentConfig::SetProviderEnabled";
-constexpr const char* kGetPort = "HostCtl::System::WbemAgentConfig::GetPort";
-constexpr const char* kSetPort = "HostCtl::System::WbemAgentConfig::SetPort";
-constexpr const char* kGetLogLevel = "HostCtl::System::WbemAgentConfig::GetLogLevel";
-constexpr const char* kSetLogLevel = "HostCtl::System::WbemAgentConfig::SetLogLevel";
-constexpr const char* kGetAuthModel = "HostCtl::System::WbemAgentConfig::GetAuthModel";
-constexpr const char* kSetAuthModel = "HostCtl::System::WbemAgentConfig::SetAuthModel";
-constexpr const char* kGetProviders = "HostCtl::System::WbemAgentConfig::GetProviders";
-constexpr const char* kResetToDefaults = "HostCtl::System::WbemAgentConfig::ResetToDefaults";
+const BrixSim::Operation kGetConfig{"HostCtl::System::SystemInfo::GetWbemAgentConfig"};
+const BrixSim::Operation kCommit{"HostCtl::System::WbemAgentConfig::Commit"};
+const BrixSim::Operation kIsEnabled{"HostCtl::System::WbemAgentConfig::IsEnabled"};
+const BrixSim::Operation kIsWsManEnabled{"HostCtl::System::WbemAgentConfig::IsWsManEnabled"};
+const BrixSim::Operation kSetEnabled{"HostCtl::System::WbemAgentConfig::SetEnabled"};
+const BrixSim::Operation kSetWsManEnabled{"HostCtl::System::WbemAgentConfig::SetWsManEnabled"};
+const BrixSim::Operation kSetProviderEnabled{
+    "HostCtl::System::WbemAgentConfig::SetProviderEnabled"};
+const BrixSim::Operation kGetPort{"HostCtl::System::WbemAgentConfig::GetPort"};
+const BrixSim::Operation kSetPort{"HostCtl::System::WbemAgentConfig::SetPort"};
+const BrixSim::Operation kGetLogLevel{"HostCtl::System::WbemAgentConfig::GetLogLevel"};
+const BrixSim::Operation kSetLogLevel{"HostCtl::System::WbemAgentConfig::SetLogLevel"};
+const BrixSim::Operation kGetAuthModel{"HostCtl::System::WbemAgentConfig::GetAuthModel"};
+const BrixSim::Operation kSetAuthModel{"HostCtl::System::WbemAgentConfig::SetAuthModel"};
+const BrixSim::Operation kGetProviders{"HostCtl::System::WbemAgentConfig::GetProviders"};
+const BrixSim::Operation kResetToDefaults{"HostCtl::System::WbemAgentConfig::ResetToDefaults"};
 
 const std::set<std::string> kLogLevels = {"debug", "info", "warning", "error"};
 
@@ -94,10 +96,6 @@ void SeedWbem(Store& store) {
 }
 
 const bool registered = [] {
-    BrixSim::RegisterOperations({kGetConfig, kCommit, kIsEnabled, kIsWsManEnabled, kSetEnabled,
-                                 kSetWsManEnabled, kSetProviderEnabled, kGetPort, kSetPort,
-                                 kGetLogLevel, kSetLogLevel, kGetAuthModel, kSetAuthModel,
-                                 kGetProviders, kResetToDefaults});
     return BrixSim::RegisterTables({
         "wbem",
         "CREATE TABLE IF NOT EXISTS wbem_config ("
@@ -147,7 +145,7 @@ void JournalService(Store& store, const char* service, const char* action) {
 }
 
 class WbemAgentConfigImpl final : public HostCtl::System::WbemAgentConfig {
-public:
+  public:
     WbemAgentConfigImpl(Settings settings, std::vector<Provider> providers)
         : settings_(std::move(settings)), providers_(std::move(providers)) {}
 
@@ -287,7 +285,7 @@ public:
         reset_ = true;
     }
 
-private:
+  private:
     // Binds the pending value of `column` to parameter 1; returns it as text for the journal.
     std::string Bind(BrixSim::Stmt& update, Column column) const {
         switch (column) {
