@@ -93,7 +93,8 @@ bool TakeGlobal(const std::vector<std::string>& args, size_t& i, Globals& global
     }
     if (TakeValue(args, i, "--formatter", Detail::FormatterNames(), value)) {
         if (!Detail::IsFormatterName(value)) {
-            throw UsageError("Error: Unknown formatter " + MessageExcerpt(value) + OneOf(Detail::FormatterNames()));
+            throw UsageError("Error: Unknown formatter " + MessageExcerpt(value) +
+                             OneOf(Detail::FormatterNames()));
         }
         globals.formatter = value;
         return true;
@@ -144,10 +145,11 @@ Request ReadRequest(const std::shared_ptr<NamespaceNode>& root,
         auto child = request.node->GetNamespaceNode(word);
         if (!child) {
             std::string path = request.node->GetPathString(' ');
-            throw UsageError("Error: Unknown command or namespace " +
-                             (path.empty() ? MessageExcerpt(word) : path + " " + MessageExcerpt(word)) + "\nValid choices" +
-                             (path.empty() ? "" : " under " + path) + ": " +
-                             ChildList(*request.node));
+            throw UsageError(
+                "Error: Unknown command or namespace " +
+                (path.empty() ? MessageExcerpt(word) : path + " " + MessageExcerpt(word)) +
+                "\nValid choices" + (path.empty() ? "" : " under " + path) + ": " +
+                ChildList(*request.node));
         }
         request.node = std::move(child);
         ++i;
@@ -234,7 +236,8 @@ Outcome ListCommands(const NamespaceNode& node, const std::string& formatter) {
 // A command's messages, each made one line whatever it holds.
 std::vector<std::string> MessageLines(const CallSpec::Output& output) {
     std::vector<std::string> lines;
-    for (const auto& message : output.GetErrorMessages()) lines.push_back(Detail::MessageLine(message));
+    for (const auto& message : output.GetErrorMessages())
+        lines.push_back(Detail::MessageLine(message));
     return lines;
 }
 

@@ -33,8 +33,8 @@ class StagedFile {
   public:
     StagedFile(const std::filesystem::path& target, std::string_view content, mode_t mode,
                off_t size = -1);
-    StagedFile(const std::filesystem::path& target, const std::vector<Extent>& extents,
-               mode_t mode, off_t size);
+    StagedFile(const std::filesystem::path& target, const std::vector<Extent>& extents, mode_t mode,
+               off_t size);
     ~StagedFile();
     StagedFile(const StagedFile&) = delete;
     StagedFile& operator=(const StagedFile&) = delete;

@@ -238,8 +238,8 @@ int unlink(const char* path) {
         auto& store = BrixSim::Store::Get();
         const auto real = store.Resolve(path);
         if (!real) return EACCES;
-        const auto* held = BrixSim::FindHeldFile(
-            std::filesystem::path(path).lexically_normal().string());
+        const auto* held =
+            BrixSim::FindHeldFile(std::filesystem::path(path).lexically_normal().string());
         int error = 0;
         store.Write([&] {
             error = held ? (*held)() : ::unlink(real->c_str()) != 0 ? errno : 0;

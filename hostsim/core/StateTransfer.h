@@ -26,8 +26,9 @@ struct ImportResult {
 
 // Replaces the tables the document holds with its rows, in one transaction: either all of them
 // or none; a version 2 document then makes the host's files its own (core/FileTransfer.h).
-// A document that cannot be applied whole is refused before anything changes. `store` is asked for only once the document's overall shape is right, so a malformed
-// document never opens (or creates) a host.
+// A document that cannot be applied whole is refused before anything changes. `store` is asked for
+// only once the document's overall shape is right, so a malformed document never opens (or creates)
+// a host.
 ImportResult ImportState(std::string_view text, const std::function<Store&()>& store);
 
 }  // namespace BrixSim

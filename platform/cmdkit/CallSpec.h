@@ -28,7 +28,7 @@ enum ParameterConstraintType : int {
 };
 
 class ParameterConstraint {
-public:
+  public:
     struct EnumValue {
         std::string value;
         std::string description;
@@ -46,7 +46,7 @@ public:
     const std::string& GetRegex() const { return regex_; }
     const std::vector<EnumValue>& GetEnumValues() const { return enums_; }
 
-private:
+  private:
     explicit ParameterConstraint(int type) : type_(type) {}
 
     int type_;
@@ -57,7 +57,7 @@ private:
 };
 
 class ParameterSpec {
-public:
+  public:
     static std::shared_ptr<ParameterSpec> New(const std::string& name, int type);
 
     void SetShortName(const std::string& shortName);
@@ -74,7 +74,7 @@ public:
     bool IsSecret() const { return secret_; }
     const std::shared_ptr<ParameterConstraint>& GetConstraint() const { return constraint_; }
 
-private:
+  private:
     ParameterSpec(std::string name, int type) : name_(std::move(name)), type_(type) {}
 
     std::string name_;
@@ -87,7 +87,7 @@ private:
 };
 
 class InputSpec {
-public:
+  public:
     static std::shared_ptr<InputSpec> New();
 
     void AddParameter(std::shared_ptr<ParameterSpec> parameter);
@@ -98,7 +98,7 @@ public:
     // The parameter with this long name, or null.
     std::shared_ptr<ParameterSpec> FindParameter(const std::string& name) const;
 
-private:
+  private:
     InputSpec() = default;
 
     std::vector<std::shared_ptr<ParameterSpec>> parameters_;
@@ -106,13 +106,13 @@ private:
 };
 
 class OutputSpec {
-public:
+  public:
     static std::shared_ptr<OutputSpec> New();
 
     void SetRootObject(std::shared_ptr<MetaObj::MetaObject> prototype);
     const std::shared_ptr<MetaObj::MetaObject>& GetRootObject() const { return root_; }
 
-private:
+  private:
     OutputSpec() = default;
 
     std::shared_ptr<MetaObj::MetaObject> root_;
@@ -121,7 +121,7 @@ private:
 // The parsed, checked arguments of one invocation. Values are kept as given on the command
 // line; the typed getters convert (the parser has already checked that they convert).
 class Input {
-public:
+  public:
     static std::shared_ptr<Input> New();
 
     std::string GetParameter(const std::string& name) const;
@@ -136,7 +136,7 @@ public:
     void AddValue(const std::string& name, const std::string& value);
     void SetContext(const std::string& name, const std::string& value);
 
-private:
+  private:
     Input() = default;
     const std::vector<std::string>* Values(const std::string& name) const;
 
@@ -145,7 +145,7 @@ private:
 };
 
 class Output {
-public:
+  public:
     static std::shared_ptr<Output> New();
 
     void SetRootObject(std::shared_ptr<MetaObj::MetaObject> object);
@@ -156,7 +156,7 @@ public:
     const std::vector<std::string>& GetErrorMessages() const { return errors_; }
     bool IsComplete() const { return complete_; }
 
-private:
+  private:
     Output() = default;
 
     std::shared_ptr<MetaObj::MetaObject> root_;

@@ -19,29 +19,29 @@ enum MetaObjectType : int {
 };
 
 class MetaObject {
-public:
+  public:
     virtual ~MetaObject() = default;
     virtual MetaObjectType GetMetaType() const = 0;
 
-protected:
+  protected:
     MetaObject() = default;
 };
 
 class MetaString : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaString> New();
     static std::shared_ptr<MetaString> New(const std::string& text);
     MetaObjectType GetMetaType() const override { return META_STRING; }
     const std::string& GetValue() const { return value_; }
     void SetValue(const std::string& text) { value_ = text; }
 
-private:
+  private:
     std::string value_;
 };
 
 // An integer that may have no value (printed as empty, or null in JSON).
 class MetaInt : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaInt> New();
     static std::shared_ptr<MetaInt> New(long value);
     MetaObjectType GetMetaType() const override { return META_INT; }
@@ -49,19 +49,19 @@ public:
     long GetValue() const { return value_.value_or(0); }
     void SetValue(long value) { value_ = value; }
 
-private:
+  private:
     std::optional<long> value_;
 };
 
 class MetaBool : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaBool> New();
     static std::shared_ptr<MetaBool> New(bool value);
     MetaObjectType GetMetaType() const override { return META_BOOL; }
     bool GetValue() const { return value_; }
     void SetValue(bool value) { value_ = value; }
 
-private:
+  private:
     bool value_ = false;
 };
 
@@ -70,7 +70,7 @@ class MetaList;
 // A named structure of labelled fields; field order is insertion order, a field set
 // again keeps its place.
 class MetaStruct : public MetaObject {
-public:
+  public:
     struct Field {
         std::string name;
         std::shared_ptr<MetaObject> value;
@@ -92,10 +92,8 @@ public:
     void SetField(const std::string& name, std::shared_ptr<MetaString> value,
                   const std::string& doc);
     void SetField(const std::string& name, std::shared_ptr<MetaInt> value, const std::string& doc);
-    void SetField(const std::string& name, std::shared_ptr<MetaBool> value,
-                  const std::string& doc);
-    void SetField(const std::string& name, std::shared_ptr<MetaList> value,
-                  const std::string& doc);
+    void SetField(const std::string& name, std::shared_ptr<MetaBool> value, const std::string& doc);
+    void SetField(const std::string& name, std::shared_ptr<MetaList> value, const std::string& doc);
     void SetField(const std::string& name, std::shared_ptr<MetaStruct> value,
                   const std::string& doc);
 
@@ -104,7 +102,7 @@ public:
     // The field's value, or null when the structure has no such field.
     std::shared_ptr<MetaObject> GetField(const std::string& name) const;
 
-private:
+  private:
     explicit MetaStruct(std::string name) : name_(std::move(name)) {}
     void Put(const std::string& name, std::shared_ptr<MetaObject> value, const std::string& doc);
 
@@ -113,7 +111,7 @@ private:
 };
 
 class MetaList : public MetaObject {
-public:
+  public:
     // elementType: META_STRING or META_STRUCT (with a prototype describing the rows).
     static std::shared_ptr<MetaList> New(int elementType);
     static std::shared_ptr<MetaList> New(int elementType, std::shared_ptr<MetaStruct> prototype);
@@ -129,7 +127,7 @@ public:
     const std::vector<std::shared_ptr<MetaObject>>& GetElements() const { return elements_; }
     size_t Size() const { return elements_.size(); }
 
-private:
+  private:
     MetaList(int elementType, std::shared_ptr<MetaStruct> prototype)
         : elementType_(elementType), prototype_(std::move(prototype)) {}
 

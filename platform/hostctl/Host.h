@@ -14,7 +14,7 @@ class NetworkInfo;
 namespace HostCtl {
 
 class Host {
-public:
+  public:
     Host();
     ~Host();
 

@@ -8,7 +8,7 @@
 namespace HostCtl::Lib {
 
 class HostCtlException : public std::exception {
-public:
+  public:
     explicit HostCtlException(const char* message) : message_(message ? message : "") {}
     explicit HostCtlException(const std::string& message) : message_(message) {}
     HostCtlException(const std::string& message, const std::string& detail)
@@ -21,7 +21,7 @@ public:
         return message_ + " (" + *detail_ + ")";
     }
 
-private:
+  private:
     std::string message_;
     std::shared_ptr<std::string> detail_;
 };

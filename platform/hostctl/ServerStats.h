@@ -6,7 +6,7 @@
 namespace HostCtl::AdvStats {
 
 class ServerStats {
-public:
+  public:
     ServerStats();
     ~ServerStats();
 
@@ -25,7 +25,7 @@ public:
     uint32_t GetLoad5() const { return load5_; }
     uint32_t GetLoad15() const { return load15_; }
 
-private:
+  private:
     int64_t uptime_ = 0;
     int32_t running_ = 0;
     int32_t loadCount_ = 0;

@@ -52,7 +52,7 @@ struct SLPStats {
 };
 
 class SlpAgent {
-public:
+  public:
     virtual ~SlpAgent();
 
     // Multicast search on the local network with the current search settings.
@@ -67,7 +67,7 @@ public:
     virtual void SetSearchTcp(bool tcp) = 0;
     virtual void GetStats(SLPStats& stats) = 0;
 
-protected:
+  protected:
     SlpAgent() = default;
 };
 

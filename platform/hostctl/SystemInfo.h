@@ -10,7 +10,7 @@ class Module;
 class WbemAgentConfig;
 
 class SystemInfo {
-public:
+  public:
     SystemInfo();
     ~SystemInfo();
 

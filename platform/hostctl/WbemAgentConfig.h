@@ -21,7 +21,7 @@ enum WbemAuthModel : int {
 };
 
 class WbemAgentConfig {
-public:
+  public:
     virtual ~WbemAgentConfig();
 
     // Stores the changed settings and restarts the services so that they take effect.
@@ -42,7 +42,7 @@ public:
     virtual std::vector<ProviderInfo> GetProviders() = 0;
     virtual void ResetToDefaults() = 0;
 
-protected:
+  protected:
     WbemAgentConfig() = default;
 };
 

@@ -12,7 +12,7 @@ enum KernAccess_KeywordType : int {
 namespace KernCtl::Security {
 
 class KernAccessInterfaceImpl {
-public:
+  public:
     KernAccessInterfaceImpl();
     ~KernAccessInterfaceImpl();
 

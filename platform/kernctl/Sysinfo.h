@@ -21,7 +21,7 @@ constexpr uint16_t KSI_NODE_system_worlds_info = 0x0602;
 namespace KernCtl::Util {
 
 class Sysinfo {
-public:
+  public:
     explicit Sysinfo(uint32_t node);
 
     // Fills `buffer` with `size` bytes of the selected instance's record.
@@ -31,7 +31,7 @@ public:
     void ResetInstance();
     void AddInstancePath(const std::string& name);
 
-private:
+  private:
     uint32_t node_;
     std::vector<std::string> instancePath_;
 };

@@ -15,7 +15,7 @@ class LogLevel;
 namespace KernCtl::System {
 
 class SystemInfoImpl {
-public:
+  public:
     SystemInfoImpl();
     ~SystemInfoImpl();
 

@@ -9,19 +9,19 @@ struct SLPStats;
 namespace OstrelCli::System {
 
 class SlpAgentStats : public virtual CmdKit::AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<SlpAgentStats> New();
     ~SlpAgentStats() override;
 
     // The empty "SlpStats" structure, every field in display order.
     static std::shared_ptr<MetaObj::MetaStruct> GetOutputStructure();
 
-protected:
+  protected:
     std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override;
     std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override;
     void ExecuteInternal(InputPtr input, OutputPtr output) override;
 
-private:
+  private:
     SlpAgentStats();
 };
 

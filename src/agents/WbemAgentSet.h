@@ -5,16 +5,16 @@
 namespace OstrelCli::System {
 
 class WbemAgentSet : public virtual CmdKit::AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<WbemAgentSet> New();
     ~WbemAgentSet() override;
 
-protected:
+  protected:
     std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override;
     std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override;
     void ExecuteInternal(InputPtr input, OutputPtr output) override;
 
-private:
+  private:
     WbemAgentSet();
 };
 

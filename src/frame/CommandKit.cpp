@@ -66,7 +66,9 @@ void Answer(CallSpec::Output& output, std::shared_ptr<MetaObj::MetaObject> resul
     output.SetComplete();
 }
 
-void Succeed(CallSpec::Output& output) { Answer(output, MetaObj::MetaBool::New(true)); }
+void Succeed(CallSpec::Output& output) {
+    Answer(output, MetaObj::MetaBool::New(true));
+}
 
 void Fail(CallSpec::Output& output, const std::string& message) {
     output.AddErrorMessage(message);

@@ -21,7 +21,7 @@ using OutputPtr = std::shared_ptr<CmdKit::CallSpec::Output>;
 
 // Builds an declared input parameter by parameter, in declaration order.
 class Params {
-public:
+  public:
     Params() : spec_(CallSpec::InputSpec::New()) {}
 
     // `shortName` may be empty.
@@ -36,7 +36,7 @@ public:
     std::shared_ptr<CallSpec::InputSpec> Done() { return spec_; }
     operator std::shared_ptr<CallSpec::InputSpec>() { return spec_; }
 
-private:
+  private:
     std::shared_ptr<CallSpec::InputSpec> spec_;
 };
 

@@ -22,7 +22,9 @@ std::shared_ptr<MetaObj::MetaStruct> BootDeviceGet::GetOutputStructure() {
     return result;
 }
 
-std::shared_ptr<CallSpec::InputSpec> BootDeviceGet::GetInputSpecInternal() { return Params(); }
+std::shared_ptr<CallSpec::InputSpec> BootDeviceGet::GetInputSpecInternal() {
+    return Params();
+}
 
 std::shared_ptr<CallSpec::OutputSpec> BootDeviceGet::GetOutputSpecInternal() {
     return Returns(GetOutputStructure());

@@ -5,17 +5,17 @@
 namespace OstrelCli::System {
 
 class BootDeviceGet : public virtual CmdKit::AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<BootDeviceGet> New();
     static std::shared_ptr<MetaObj::MetaStruct> GetOutputStructure();
     ~BootDeviceGet() override;
 
-protected:
+  protected:
     std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override;
     std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override;
     void ExecuteInternal(InputPtr input, OutputPtr output) override;
 
-private:
+  private:
     BootDeviceGet();
 };
 

@@ -18,7 +18,9 @@ InstallTimeGet::InstallTimeGet() {
 
 InstallTimeGet::~InstallTimeGet() = default;
 
-std::shared_ptr<CallSpec::InputSpec> InstallTimeGet::GetInputSpecInternal() { return Params(); }
+std::shared_ptr<CallSpec::InputSpec> InstallTimeGet::GetInputSpecInternal() {
+    return Params();
+}
 
 std::shared_ptr<CallSpec::OutputSpec> InstallTimeGet::GetOutputSpecInternal() {
     return Returns(MetaObj::MetaString::New());

@@ -48,7 +48,9 @@ std::shared_ptr<MetaObj::MetaStruct> VersionGet::GetOutputStructure() {
     return result;
 }
 
-std::shared_ptr<CallSpec::InputSpec> VersionGet::GetInputSpecInternal() { return Params(); }
+std::shared_ptr<CallSpec::InputSpec> VersionGet::GetInputSpecInternal() {
+    return Params();
+}
 
 std::shared_ptr<CallSpec::OutputSpec> VersionGet::GetOutputSpecInternal() {
     return Returns(GetOutputStructure());

@@ -5,17 +5,17 @@
 namespace OstrelCli::System {
 
 class VersionGet : public virtual CmdKit::AutoCli::Command {
-public:
+  public:
     static std::shared_ptr<VersionGet> New();
     static std::shared_ptr<MetaObj::MetaStruct> GetOutputStructure();
     ~VersionGet() override;
 
-protected:
+  protected:
     std::shared_ptr<CallSpec::InputSpec> GetInputSpecInternal() override;
     std::shared_ptr<CallSpec::OutputSpec> GetOutputSpecInternal() override;
     void ExecuteInternal(InputPtr input, OutputPtr output) override;
 
-private:
+  private:
     VersionGet();
 };
 

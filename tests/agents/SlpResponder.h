@@ -40,7 +40,7 @@ struct Request {
 };
 
 class Responder {
-public:
+  public:
     Responder(std::vector<Service> services, Behaviour behaviour = Behaviour::Answer);
     ~Responder();
     Responder(const Responder&) = delete;
@@ -54,7 +54,7 @@ public:
                                              uint16_t errorCode = 0);
     static std::vector<uint8_t> AgentAdvert(uint16_t xid, const std::string& url);
 
-private:
+  private:
     void Run();
     void HandleUdp();
     void HandleTcp();

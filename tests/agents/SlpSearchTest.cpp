@@ -4,8 +4,8 @@
 #include <chrono>
 #include <map>
 
-#include "brixcli/SystemPlugin.h"
 #include "SlpResponder.h"
+#include "brixcli/SystemPlugin.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -3,8 +3,8 @@
 
 #include <random>
 
-#include "agents/slp/SlpWire.h"
 #include "SlpResponder.h"
+#include "agents/slp/SlpWire.h"
 
 namespace {
 

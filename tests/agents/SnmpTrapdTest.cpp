@@ -14,8 +14,8 @@
 #include <cstdlib>
 #include <thread>
 
-#include "agents/snmp/UsmKeys.h"
 #include "SnmpSupport.h"
+#include "agents/snmp/UsmKeys.h"
 
 extern char** environ;
 

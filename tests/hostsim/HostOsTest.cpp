@@ -178,8 +178,8 @@ TEST(HostOs, UnlinkStaysInsideTheRoot) {
         int error;
     };
     const Case refused[] = {
-        {"/var/tmp/old.log", ENOENT}, {"/var/tmp", EISDIR}, {"/../etc/hostname", EACCES},
-        {"/var/tmp/escape/x", EACCES},      {"", ENOENT},
+        {"/var/tmp/old.log", ENOENT},  {"/var/tmp", EISDIR}, {"/../etc/hostname", EACCES},
+        {"/var/tmp/escape/x", EACCES}, {"", ENOENT},
     };
     for (const auto& c : refused) {
         SCOPED_TRACE(c.path);

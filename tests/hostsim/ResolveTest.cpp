@@ -18,8 +18,8 @@ TEST(Resolve, ConfinesPathsToTheRoot) {
     fs::create_directories(root / "etc/ostrel");
     fs::create_directories(root / "datastores/ds1");
     fs::create_symlink("/etc", root / "etc/outside");             // absolute, leaves the root
-    fs::create_symlink("../../..", root / "datastores/up");     // climbs out of the root
-    fs::create_symlink("ds1", root / "datastores/datastore1");  // stays inside
+    fs::create_symlink("../../..", root / "datastores/up");       // climbs out of the root
+    fs::create_symlink("ds1", root / "datastores/datastore1");    // stays inside
     fs::create_symlink("/etc/passwd", root / "etc/passwd-link");  // a file link that leaves
     fs::create_symlink("ostrel", root / "etc/ostrel-link");
     fs::create_symlink("loop-b", root / "loop-a");

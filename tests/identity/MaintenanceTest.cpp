@@ -98,7 +98,8 @@ TEST(MaintenanceMode, FailuresAreReported) {
     JournalMark none(host);
     ExpectRefused(host.Cli({"system", "maintenanceMode", "set", "-e", "true"}),
                   "state unavailable (management service busy)");
-    ExpectRefused(host.Cli({"system", "maintenanceMode", "get"}), "state unavailable (management service busy)");
+    ExpectRefused(host.Cli({"system", "maintenanceMode", "get"}),
+                  "state unavailable (management service busy)");
     EXPECT_TRUE(none.Added({"exec"}).empty());
 
     // An unlisted Dorna mode is the framework's to refuse.

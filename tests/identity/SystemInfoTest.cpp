@@ -23,7 +23,8 @@ TEST(SystemInfo, JsonOutputOfEveryQuery) {
                          "Update":"2","Patch":"41"})")},
         {{"system", "stats", "installtime", "get"}, "2025-03-14T09:26:53.589793+00:00"},
         {{"system", "boot", "device", "get"},
-         json::parse(R"({"Boot NIC":"","Boot Filesystem UUID":"c41f9e02-7d3a-4e6b-a8c5-2f90b17d64e8",
+         json::parse(
+             R"({"Boot NIC":"","Boot Filesystem UUID":"c41f9e02-7d3a-4e6b-a8c5-2f90b17d64e8",
                          "Stateless Boot NIC":""})")},
         {{"system", "welcomemsg", "get"}, "Welcome to Brix Host"},
     };
@@ -72,16 +73,21 @@ struct FaultCase {
 TEST(SystemInfo, FaultsBecomeMessagesWithPrefixes) {
     const FaultCase cases[] = {
         {"KernCtl::System::SystemInfoImpl::GetSystemUuid", {"system", "uuid", "get"}, "boom"},
-        {"KernCtl::Util::Sysinfo::Get", {"system", "version", "get"},
+        {"KernCtl::Util::Sysinfo::Get",
+         {"system", "version", "get"},
          "Unable to query product version: boom"},
-        {"HostCtl::System::SystemInfo::GetInceptionTime", {"system", "stats", "installtime", "get"},
+        {"HostCtl::System::SystemInfo::GetInceptionTime",
+         {"system", "stats", "installtime", "get"},
          "system inception timestamp missing: boom"},
-        {"KernCtl::System::SystemInfoImpl::GetBootFsUUID", {"system", "boot", "device", "get"},
+        {"KernCtl::System::SystemInfoImpl::GetBootFsUUID",
+         {"system", "boot", "device", "get"},
          "boom"},
-        {"KernCtl::System::SystemInfoImpl::GetWelcomeMessage", {"system", "welcomemsg", "get"},
+        {"KernCtl::System::SystemInfoImpl::GetWelcomeMessage",
+         {"system", "welcomemsg", "get"},
          "boom"},
         {"KernCtl::System::SystemInfoImpl::SetWelcomeMessage",
-         {"system", "welcomemsg", "set", "-m", "x"}, "boom"},
+         {"system", "welcomemsg", "set", "-m", "x"},
+         "boom"},
     };
     for (const auto& c : cases) {
         BrixTest::TempHost host;

@@ -8,12 +8,12 @@
 #include <utility>
 #include <vector>
 
-#include "support/CliJson.h"
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/AutoCli.h"
 #include "modules/KernelLogList.h"
 #include "modules/KernelLogSetLevel.h"
 #include "os/HostOs.h"
+#include "support/CliJson.h"
 
 namespace {
 

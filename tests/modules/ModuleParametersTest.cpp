@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
-#include "support/CliJson.h"
 #include "cmdkit/CallSpec.h"
 #include "modules/ModuleParametersCopy.h"
+#include "support/CliJson.h"
 
 namespace {
 

@@ -59,16 +59,16 @@ TEST_P(Valgrind, RunsWithoutMemoryErrorsOrLeaks) {
     TempHost host;
     ASSERT_EQ(host.Cli({"system", "uuid", "get"}).status, 0);  // seeds the host
 
-    std::vector<std::string> argv{valgrind,
-                                  "--quiet",
-                                  "--leak-check=full",
-                                  "--errors-for-leak-kinds=definite,indirect",
-                                  "--show-leak-kinds=definite,indirect",
-                                  "--error-exitcode=99",
-                                  "--suppressions=" + (BrixTest::SourceDir() / "tests" /
-                                                       "robustness" / "valgrind.supp")
-                                                          .string(),
-                                  BrixRobust::Program("brixcli")};
+    std::vector<std::string> argv{
+        valgrind,
+        "--quiet",
+        "--leak-check=full",
+        "--errors-for-leak-kinds=definite,indirect",
+        "--show-leak-kinds=definite,indirect",
+        "--error-exitcode=99",
+        "--suppressions=" +
+            (BrixTest::SourceDir() / "tests" / "robustness" / "valgrind.supp").string(),
+        BrixRobust::Program("brixcli")};
     for (const auto& word : BrixRobust::Words(GetParam().line)) argv.push_back(word);
     const auto run = BrixTest::Run(argv);
     // With --quiet valgrind prints only what it finds, so the command's own error stays alone.

@@ -2,10 +2,9 @@
 #pragma once
 
 #include <filesystem>
+#include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
-
-#include <nlohmann/json.hpp>
 
 namespace BrixTest {
 
@@ -19,7 +18,7 @@ struct RunResult {
 // names it and BRIXSIM_SLEEP_SCALE is 0, for this process and the programs it runs; the
 // in-process store is reopened on it.
 class TempHost {
-public:
+  public:
     TempHost();
     ~TempHost();
     TempHost(const TempHost&) = delete;
@@ -44,7 +43,7 @@ public:
     void Import(const nlohmann::json& state) const;
     nlohmann::json Export() const;
 
-private:
+  private:
     std::filesystem::path root_;
     // The environment this host replaced, restored when it goes.
     std::string oldRoot_, oldScale_;

@@ -63,7 +63,7 @@ bool IsDisplayable(const uint8_t* text, size_t size) {
 
 // Bounds-checked reading of one message; every read fails once the end is passed.
 class Reader {
-public:
+  public:
     Reader(const uint8_t* data, size_t size) : data_(data), size_(size) {}
 
     bool U8(uint8_t& value) {
@@ -122,7 +122,7 @@ public:
     bool AtEnd() const { return pos_ == size_; }
     size_t Position() const { return pos_; }
 
-private:
+  private:
     const uint8_t* data_;
     size_t size_;
     size_t pos_ = 0;
