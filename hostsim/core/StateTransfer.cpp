@@ -1,7 +1,5 @@
 #include "core/StateTransfer.h"
 
-#include <sqlite3.h>
-
 #include <algorithm>
 #include <map>
 #include <nlohmann/json.hpp>
@@ -46,22 +44,18 @@ std::vector<std::string> Columns(Store& store, const std::string& table) {
     return columns;
 }
 
-void BindJson(sqlite3* db, sqlite3_stmt* stmt, int index, const nlohmann::json& value) {
-    int rc = SQLITE_OK;
+void BindJson(Stmt& stmt, int index, const nlohmann::json& value) {
     if (value.is_null()) {
-        rc = sqlite3_bind_null(stmt, index);
+        stmt.BindNull(index);
     } else if (value.is_boolean()) {
-        rc = sqlite3_bind_int64(stmt, index, value.get<bool>() ? 1 : 0);
+        stmt.Bind(index, value.get<bool>());
     } else if (value.is_number_integer()) {
-        rc = sqlite3_bind_int64(stmt, index, value.get<int64_t>());
+        stmt.Bind(index, value.get<int64_t>());
     } else if (value.is_number_float()) {
-        rc = sqlite3_bind_double(stmt, index, value.get<double>());
+        stmt.Bind(index, value.get<double>());
     } else {
-        const auto& text = value.get_ref<const std::string&>();
-        rc = sqlite3_bind_text(stmt, index, text.data(), static_cast<int>(text.size()),
-                               SQLITE_TRANSIENT);
+        stmt.Bind(index, value.get_ref<const std::string&>());
     }
-    if (rc != SQLITE_OK) throw std::runtime_error(sqlite3_errmsg(db));
 }
 
 }  // namespace
@@ -75,36 +69,27 @@ std::string ExportState(Store& store) {
     try {
         for (const auto& table : StateTables(store)) {
             auto& rows = tables[table] = nlohmann::ordered_json::array();
-            sqlite3_stmt* stmt = nullptr;
-            const std::string sql = "SELECT * FROM " + Quote(table);
-            if (sqlite3_prepare_v2(store.Db(), sql.c_str(), -1, &stmt, nullptr) != SQLITE_OK) {
-                throw std::runtime_error(sqlite3_errmsg(store.Db()));
-            }
-            int rc;
-            while ((rc = sqlite3_step(stmt)) == SQLITE_ROW) {
+            auto stmt = store.Prepare("SELECT * FROM " + Quote(table));
+            while (stmt.Step()) {
                 nlohmann::ordered_json row = nlohmann::ordered_json::object();
-                for (int column = 0; column < sqlite3_column_count(stmt); ++column) {
-                    const std::string name = sqlite3_column_name(stmt, column);
-                    switch (sqlite3_column_type(stmt, column)) {
-                        case SQLITE_INTEGER:
-                            row[name] = static_cast<int64_t>(sqlite3_column_int64(stmt, column));
+                for (int column = 0; column < stmt.ColumnCount(); ++column) {
+                    const std::string name = stmt.ColumnName(column);
+                    switch (stmt.ColumnKind(column)) {
+                        case Stmt::Kind::Integer:
+                            row[name] = stmt.Int(column);
                             break;
-                        case SQLITE_FLOAT:
-                            row[name] = sqlite3_column_double(stmt, column);
+                        case Stmt::Kind::Float:
+                            row[name] = stmt.Float(column);
                             break;
-                        case SQLITE_NULL:
+                        case Stmt::Kind::Null:
                             row[name] = nullptr;
                             break;
-                        default:
-                            row[name] = std::string(
-                                reinterpret_cast<const char*>(sqlite3_column_text(stmt, column)),
-                                static_cast<size_t>(sqlite3_column_bytes(stmt, column)));
+                        case Stmt::Kind::Text:
+                            row[name] = stmt.Text(column);
                     }
                 }
                 rows.push_back(std::move(row));
             }
-            sqlite3_finalize(stmt);
-            if (rc != SQLITE_DONE) throw std::runtime_error(sqlite3_errmsg(store.Db()));
         }
     } catch (...) {
         store.Exec("ROLLBACK");
@@ -195,26 +180,16 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
                                                 ? "INSERT INTO " + Quote(table) + " DEFAULT VALUES"
                                                 : "INSERT INTO " + Quote(table) + " (" + names +
                                                       ") VALUES (" + marks + ")";
-                    sqlite3_stmt* stmt = nullptr;
-                    if (sqlite3_prepare_v2(store.Db(), sql.c_str(), -1, &stmt, nullptr) !=
-                        SQLITE_OK) {
-                        throw std::runtime_error(sqlite3_errmsg(store.Db()));
-                    }
+                    auto stmt = store.Prepare(sql);
                     int index = 1;
-                    try {
-                        for (const auto& [column, value] : row.items()) {
-                            (void)column;
-                            BindJson(store.Db(), stmt, index++, value);
-                        }
-                    } catch (...) {
-                        sqlite3_finalize(stmt);
-                        throw;
+                    for (const auto& [column, value] : row.items()) {
+                        (void)column;
+                        BindJson(stmt, index++, value);
                     }
-                    const int rc = sqlite3_step(stmt);
-                    const std::string error = sqlite3_errmsg(store.Db());
-                    sqlite3_finalize(stmt);
-                    if (rc != SQLITE_DONE) {
-                        throw std::runtime_error("table \"" + table + "\": " + error);
+                    try {
+                        stmt.Run();
+                    } catch (const StoreError& error) {
+                        throw std::runtime_error("table \"" + table + "\": " + error.Reason());
                     }
                 }
             }

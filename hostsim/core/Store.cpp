@@ -65,7 +65,7 @@ constexpr const char* kMarkerFormat = "brixhost 1";
         message += std::string(" (") + std::strerror(sqlite3_system_errno(db)) + ")";
     }
     if (!context.empty()) message += " in \"" + std::string(context) + "\"";
-    throw StoreError(message, code);
+    throw StoreError(message, code, db ? sqlite3_errmsg(db) : "out of memory");
 }
 
 std::unique_ptr<Store>& Instance() {
@@ -193,6 +193,11 @@ Stmt& Stmt::Bind(int index, int64_t value) {
     return *this;
 }
 
+Stmt& Stmt::Bind(int index, double value) {
+    if (sqlite3_bind_double(stmt_, index, value) != SQLITE_OK) ThrowStoreError(db_);
+    return *this;
+}
+
 Stmt& Stmt::BindNull(int index) {
     if (sqlite3_bind_null(stmt_, index) != SQLITE_OK) {
         ThrowStoreError(db_);
@@ -229,6 +234,32 @@ std::string Stmt::Text(int column) const {
 
 int64_t Stmt::Int(int column) const {
     return sqlite3_column_int64(stmt_, column);
+}
+
+double Stmt::Float(int column) const {
+    return sqlite3_column_double(stmt_, column);
+}
+
+int Stmt::ColumnCount() const {
+    return sqlite3_column_count(stmt_);
+}
+
+std::string Stmt::ColumnName(int column) const {
+    const char* name = sqlite3_column_name(stmt_, column);
+    return name ? name : "";
+}
+
+Stmt::Kind Stmt::ColumnKind(int column) const {
+    switch (sqlite3_column_type(stmt_, column)) {
+        case SQLITE_INTEGER:
+            return Kind::Integer;
+        case SQLITE_FLOAT:
+            return Kind::Float;
+        case SQLITE_NULL:
+            return Kind::Null;
+        default:
+            return Kind::Text;
+    }
 }
 
 bool Stmt::IsNull(int column) const {

@@ -32,11 +32,15 @@ using Fields = std::vector<std::pair<std::string, Value>>;
 // `Code()` is SQLite's extended result code (0 when the failure is not SQLite's).
 class StoreError : public std::runtime_error {
   public:
-    StoreError(const std::string& message, int code) : std::runtime_error(message), code_(code) {}
+    StoreError(const std::string& message, int code, std::string reason = {})
+        : std::runtime_error(message), code_(code), reason_(std::move(reason)) {}
     int Code() const { return code_; }
+    // What is wrong, without the file: SQLite's own text.
+    const std::string& Reason() const { return reason_; }
 
   private:
     int code_;
+    std::string reason_;
 };
 
 // A prepared statement; bind with 1-based indexes, step, read columns.
@@ -58,6 +62,7 @@ class Stmt {
     Stmt& Bind(int index, T value) {
         return Bind(index, static_cast<int64_t>(value));
     }
+    Stmt& Bind(int index, double value);
     Stmt& BindNull(int index);
 
     // True while a row is available.
@@ -68,7 +73,14 @@ class Stmt {
 
     std::string Text(int column) const;
     int64_t Int(int column) const;
+    double Float(int column) const;
     bool IsNull(int column) const;
+
+    // The shape of a row, for statements built at run time.
+    enum class Kind { Integer, Float, Text, Null };
+    int ColumnCount() const;
+    std::string ColumnName(int column) const;
+    Kind ColumnKind(int column) const;
 
   private:
     friend class Store;
