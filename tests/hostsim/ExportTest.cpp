@@ -32,6 +32,8 @@ const char* const kChanges[] = {
     "system coredump file set -p /datastores/ds-archive/coredump/extra.dumpfile",
     "system coredump file remove -f /datastores/ds-shared-02/coredump/coredump-1.dumpfile -F",
     "system coredump dorna set -U b81f04d6-2e7c-4a93-9d58-16fa0c3e72ab",
+    "system coredump dorna add -s 100",
+    "system coredump dorna remove -u 3c9e7a41-5b2d-4f86-a1c0-7d84e2b9f615 -F",
     "system secpolicy domain set -n shellTools -l audit",
     "system welcomemsg set -m \"Round trip\"",
     "system quillfs ramdisk add -m 1 -M 8 -p 0755 -n scratch -t /var/tmp",
