@@ -471,9 +471,11 @@ void Store::Open() {
                              0);
         }
     }
-    // What a folder holds before the host is made is not the host's.
+    // What a folder adopted by `init --force` holds before the host is made is not the host's.
+    // Otherwise the folder was empty, or holds a host another process is making right now,
+    // whose entries are the host's too.
     std::set<std::string> before;
-    if (!marked) {
+    if (!marked && AdoptingFolder()) {
         for (fs::directory_iterator it(root_, ec), end; !ec && it != end; it.increment(ec)) {
             before.insert(it->path().filename().string());
         }
