@@ -64,8 +64,15 @@ std::string ExportState(Store& store) {
     nlohmann::ordered_json document;
     document["version"] = kFormatVersion;
     auto& tables = document["tables"] = nlohmann::ordered_json::object();
-    // One read transaction, so the document is a consistent snapshot.
-    store.Exec("BEGIN");
+    // The write lock, so the document is one state of the host: writers publish their files
+    // while they hold it, and none can start meanwhile. A host this process cannot write has
+    // no writers to keep out, and is read in a plain read transaction.
+    try {
+        store.Exec("BEGIN IMMEDIATE");
+    } catch (const StoreError& error) {
+        if ((error.Code() & 0xff) != 8 /* SQLITE_READONLY */) throw;
+        store.Exec("BEGIN");
+    }
     try {
         for (const auto& table : StateTables(store)) {
             auto& rows = tables[table] = nlohmann::ordered_json::array();
@@ -95,8 +102,7 @@ std::string ExportState(Store& store) {
         store.Exec("ROLLBACK");
         throw;
     }
-    // The files, inside the same read transaction: no writer changes them meanwhile, as every
-    // writer holds the store's write lock while it publishes.
+    // The files, under the same lock.
     try {
         document["files"] = ExportFiles(store.Root());
     } catch (...) {
