@@ -142,7 +142,8 @@ TEST(SnmpConfig, PortRangeAndNothingCommittedOnFailure) {
     BrixTest::TempHost host;
     const std::string portMessage =
         "Port must be in range 0 - 65535 and not be already in use by another application.\n";
-    for (const char* port : {"65536", "-1", "18446744073709551615"}) {
+    // 4294967296 is 0 when cut to 32 bits: it is checked whole.
+    for (const char* port : {"65536", "-1", "4294967296", "18446744073709551615"}) {
         const auto run = Snmp(host, {"set", "--enable", "true", "--port", port});
         if (std::string(port) == "18446744073709551615") {
             EXPECT_EQ(run.status, 2) << "not a signed 64-bit integer";

@@ -102,6 +102,7 @@ INSTANTIATE_TEST_SUITE_P(
                 "Error: Invalid value for --count: 99999999999999999999x is not an integer"},
         // The type is checked before the range.
         Refusal{With({"--port", "80x"}), "Error: Invalid value for --port: 80x is not an integer"},
+        Refusal{With({"--port", "0x1"}), "Error: Invalid value for --port: 0x1 is not an integer"},
         Refusal{With({"--port", "0"}),
                 "Error: Invalid value for --port: 0 is not in the range 1..65525"},
         Refusal{With({"--port", "65526"}),
