@@ -47,13 +47,22 @@ const char* const kChanges[] = {
     "system maintenanceMode set -e true",
 };
 
-// Questions whose answers move with the clock or go out to the network.
+// Questions whose answers move with the clock.
 bool AnswerIsStable(const std::string& path) {
     for (const char* moving : {"system time get", "system stats uptime get"}) {
         if (path == moving) return false;
     }
     const auto last = path.substr(path.rfind(' ') + 1);
     return last == "get" || last == "list";
+}
+
+// The answer without the fields that tell the time of asking; two hosts are asked moments apart.
+std::string WithoutClockFields(const std::string& path, const std::string& json) {
+    if (path != "system slp stats get" || json.empty()) return json;
+    auto answer = nlohmann::json::parse(json);
+    answer.erase("Date");
+    answer.erase("Uptime");
+    return answer.dump(2);
 }
 
 std::vector<std::string> Words(const std::string& path) {
@@ -94,7 +103,8 @@ TEST(Export, RoundTripKeepsTheWholeHost) {
         const auto first = original.Cli(args);
         const auto second = copy.Cli(args);
         EXPECT_EQ(first.status, second.status) << path;
-        EXPECT_EQ(first.out, second.out) << path;
+        EXPECT_EQ(WithoutClockFields(path, first.out), WithoutClockFields(path, second.out))
+            << path;
         EXPECT_EQ(first.err, second.err) << path;
         ++asked;
     }
