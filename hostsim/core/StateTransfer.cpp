@@ -3,11 +3,13 @@
 #include <algorithm>
 #include <map>
 #include <nlohmann/json.hpp>
+#include <optional>
 #include <set>
 #include <stdexcept>
 #include <vector>
 
 #include "core/FileTransfer.h"
+#include "core/StagedTree.h"
 #include "core/Store.h"
 
 namespace BrixSim {
@@ -64,9 +66,9 @@ std::string ExportState(Store& store) {
     nlohmann::ordered_json document;
     document["version"] = kFormatVersion;
     auto& tables = document["tables"] = nlohmann::ordered_json::object();
-    // One read transaction, so the document is a consistent snapshot.
-    store.Exec("BEGIN");
-    try {
+    // The tables and the files as of one moment: every writer publishes its files while it
+    // holds the write lock, which this read holds too.
+    store.ReadExclusive([&] {
         for (const auto& table : StateTables(store)) {
             auto& rows = tables[table] = nlohmann::ordered_json::array();
             auto stmt = store.Prepare("SELECT * FROM " + Quote(table));
@@ -91,19 +93,8 @@ std::string ExportState(Store& store) {
                 rows.push_back(std::move(row));
             }
         }
-    } catch (...) {
-        store.Exec("ROLLBACK");
-        throw;
-    }
-    // The files, inside the same read transaction: no writer changes them meanwhile, as every
-    // writer holds the store's write lock while it publishes.
-    try {
         document["files"] = ExportFiles(store.Root());
-    } catch (...) {
-        store.Exec("ROLLBACK");
-        throw;
-    }
-    store.Exec("COMMIT");
+    });
     return document.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
 }
 
@@ -128,10 +119,17 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
         return invalid("\"tables\" must be an object");
     }
     const bool withFiles = document["version"] == kFormatVersion;
+    std::vector<FileEntry> files;
     if (withFiles) {
         if (!document.contains("files")) return invalid("\"files\" is missing");
-        if (const std::string problem = CheckFiles(document["files"]); !problem.empty()) {
+        if (const std::string problem = ParseFiles(document["files"], files); !problem.empty()) {
             return invalid(problem);
+        }
+    }
+    for (const auto& [key, value] : document.items()) {
+        (void)value;
+        if (key != "version" && key != "tables" && (key != "files" || !withFiles)) {
+            return invalid("the document has no \"" + key + "\"");
         }
     }
     Store& store = openStore();
@@ -162,8 +160,12 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
             }
         }
     }
+    bool replacingFiles = false;
     try {
         store.Write([&] {
+            // Every file is written out before anything changes, so a full disk changes nothing.
+            std::optional<StagedTree> staged;
+            if (withFiles) staged.emplace(store.Root(), files);
             // Tables are replaced one after another; references between them are checked
             // once all are in place.
             store.Exec("PRAGMA defer_foreign_keys=ON");
@@ -194,9 +196,11 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
                 }
             }
             // Last, so that a table the store refuses leaves the files untouched too.
-            if (withFiles) ImportFiles(store.Root(), document["files"]);
+            replacingFiles = withFiles;
+            if (staged) staged->Apply();
         });
     } catch (const std::runtime_error& e) {
+        if (replacingFiles) return {ImportResult::Status::Failed, e.what()};
         return invalid(e.what());
     }
     return {};
