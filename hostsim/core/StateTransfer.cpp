@@ -60,6 +60,30 @@ void BindJson(Stmt& stmt, int index, const nlohmann::json& value) {
     }
 }
 
+// Where in `value` the first text that is not UTF-8 lies, as a JSON pointer ("/files/3/path").
+std::string NonUtf8Text(const nlohmann::ordered_json& value, const std::string& at) {
+    if (value.is_string()) {
+        try {
+            (void)value.dump();
+        } catch (const nlohmann::json::type_error&) {
+            return at;
+        }
+    } else if (value.is_object()) {
+        // Keys are the store's own table and column names.
+        for (const auto& [key, member] : value.items()) {
+            if (auto found = NonUtf8Text(member, at + "/" + key); !found.empty()) return found;
+        }
+    } else if (value.is_array()) {
+        for (size_t index = 0; index < value.size(); ++index) {
+            if (auto found = NonUtf8Text(value[index], at + "/" + std::to_string(index));
+                !found.empty()) {
+                return found;
+            }
+        }
+    }
+    return {};
+}
+
 }  // namespace
 
 std::string ExportState(Store& store) {
@@ -95,7 +119,13 @@ std::string ExportState(Store& store) {
         }
         document["files"] = ExportFiles(store.Root());
     });
-    return document.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+    try {
+        return document.dump(2);
+    } catch (const nlohmann::json::type_error&) {
+        // A name or a value a JSON text cannot hold as it is: refused rather than altered.
+        throw std::runtime_error("cannot export: the text at " + NonUtf8Text(document, "") +
+                                 " is not UTF-8");
+    }
 }
 
 ImportResult ImportState(std::string_view text, const std::function<Store&()>& openStore) {

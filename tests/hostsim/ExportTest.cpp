@@ -343,4 +343,19 @@ TEST(Export, AFileThatCannotBeWrittenChangesNothing) {
     }
 }
 
+TEST(Export, ANameThatIsNotUtf8IsRefusedNotAltered) {
+    BrixTest::TempHost host;
+    const auto files = host.Export()["files"];
+    // The new name sorts right after its folder.
+    const auto index = std::count_if(files.begin(), files.end(), [](const nlohmann::json& entry) {
+        return entry["path"] <= "tmp";
+    });
+    std::ofstream(host.Root() / "tmp/q\xfe") << "x";
+    const auto run = host.Sim({"export"});
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.err, "brixsim: cannot export: the text at /files/" + std::to_string(index) +
+                           "/path is not UTF-8\n");
+    EXPECT_EQ(run.out, "");
+}
+
 }  // namespace
