@@ -14,7 +14,6 @@
 #include <system_error>
 #include <vector>
 
-#include "core/DurableWrite.h"
 #include "core/Fd.h"
 
 namespace BrixSim {
@@ -25,23 +24,6 @@ namespace {
 
 // Largest file a document may carry: more than any file the host keeps (dump files are sparse).
 constexpr uint64_t kMaxFileSize = uint64_t{1} << 40;
-
-// Names the export leaves out: the store, the marker, and what writers hold only while writing.
-bool IsBookkeeping(const fs::path& relative) {
-    const std::string name = relative.filename().string();
-    if (relative.parent_path().empty()) {
-        for (const char* own :
-             {"host.db", "host.db-wal", "host.db-shm", "host.db-journal", ".brixhost"}) {
-            if (name == own) return true;
-        }
-        if (name.rfind(".brixhost.", 0) == 0) return true;
-    }
-    if (name.size() > 1 && name[0] == '.') {
-        if (name.size() > 5 && name.compare(name.size() - 5, 5, ".lock") == 0) return true;
-        if (name.find(".tmp-") != std::string::npos) return true;
-    }
-    return false;
-}
 
 std::string Base64(const std::string& bytes) {
     using namespace boost::archive::iterators;
@@ -135,15 +117,45 @@ bool IsPlainRelative(const std::string& text) {
     return text.find("//") == std::string::npos;
 }
 
-// Removes what stands at `path` unless it is a real folder, and makes it one.
-void EnsureFolder(const fs::path& path, mode_t mode) {
-    struct stat info {};
-    if (::lstat(path.c_str(), &info) == 0 && !S_ISDIR(info.st_mode)) fs::remove(path);
-    if (::lstat(path.c_str(), &info) != 0) fs::create_directory(path);
-    fs::permissions(path, static_cast<fs::perms>(mode));
+// Whether a link at `path` with `target` leads to somewhere inside the root: a relative target
+// whose ".." all lead, so it climbs only through the link's own folders (real ones, as the
+// document has them) before it descends, and never above the root.
+bool IsInsideFrom(const std::string& path, const std::string& target) {
+    if (target.empty() || target.front() == '/' || target.find('\0') != std::string::npos) {
+        return false;
+    }
+    size_t climbs = 0;
+    bool descending = false;
+    for (const auto& part : fs::path(target)) {
+        if (part == "..") {
+            if (descending) return false;
+            ++climbs;
+        } else if (!part.empty() && part != ".") {
+            descending = true;
+        }
+    }
+    const auto depth = static_cast<size_t>(
+        std::distance(fs::path(path).parent_path().begin(), fs::path(path).parent_path().end()));
+    return climbs <= depth;
 }
 
 }  // namespace
+
+bool IsLeftOut(const fs::path& relative) {
+    const std::string name = relative.filename().string();
+    if (relative.parent_path().empty()) {
+        for (const char* own :
+             {"host.db", "host.db-wal", "host.db-shm", "host.db-journal", ".brixhost"}) {
+            if (name == own) return true;
+        }
+        if (name.rfind(".brixhost.", 0) == 0) return true;
+    }
+    if (name.size() > 1 && name[0] == '.') {
+        if (name.size() > 5 && name.compare(name.size() - 5, 5, ".lock") == 0) return true;
+        if (name.find(".tmp-") != std::string::npos) return true;
+    }
+    return false;
+}
 
 nlohmann::ordered_json ExportFiles(const fs::path& root) {
     std::map<std::string, nlohmann::ordered_json> entries;
@@ -151,7 +163,7 @@ nlohmann::ordered_json ExportFiles(const fs::path& root) {
     for (fs::recursive_directory_iterator it(root, fs::directory_options::none, ec), end;
          !ec && it != end; it.increment(ec)) {
         const fs::path relative = it->path().lexically_relative(root);
-        if (IsBookkeeping(relative)) {
+        if (IsLeftOut(relative)) {
             if (it->is_directory(ec) && !it->is_symlink(ec)) it.disable_recursion_pending();
             continue;
         }
@@ -183,119 +195,106 @@ nlohmann::ordered_json ExportFiles(const fs::path& root) {
     return files;
 }
 
-std::string CheckFiles(const nlohmann::json& files) {
+std::string ParseFiles(const nlohmann::json& files, std::vector<FileEntry>& entries) {
     if (!files.is_array()) return "\"files\" must be an array";
-    std::map<std::string, std::string> types;
+    std::map<std::string, FileEntry> parsed;
     size_t index = 0;
-    for (const auto& entry : files) {
+    for (const auto& json : files) {
         const std::string where = "file entry " + std::to_string(index++);
-        if (!entry.is_object()) return where + " is not an object";
-        if (!entry.contains("path") || !entry["path"].is_string() ||
-            !IsPlainRelative(entry["path"].get<std::string>())) {
+        if (!json.is_object()) return where + " is not an object";
+        if (!json.contains("path") || !json["path"].is_string() ||
+            !IsPlainRelative(json["path"].get<std::string>())) {
             return where + ": \"path\" must be a relative path of plain names";
         }
-        const std::string path = entry["path"].get<std::string>();
-        if (IsBookkeeping(path)) return where + ": " + path + " belongs to the store";
-        const std::string type = entry.value("type", "");
-        if (!types.emplace(path, type).second) return where + ": " + path + " given twice";
-        if (type == "link") {
-            if (!entry.contains("target") || !entry["target"].is_string()) {
-                return where + ": a link needs a \"target\"";
-            }
-            const fs::path target = entry["target"].get<std::string>();
-            const fs::path resolved = (fs::path(path).parent_path() / target).lexically_normal();
-            if (target.empty() || target.is_absolute() || resolved.empty() ||
-                *resolved.begin() == "..") {
-                return where + ": a link must point inside the host";
-            }
-            continue;
-        }
-        if (type != "file" && type != "folder") {
+        FileEntry entry;
+        entry.path = json["path"].get<std::string>();
+        if (IsLeftOut(entry.path)) return where + ": " + entry.path + " belongs to the store";
+        const std::string type = json.contains("type") && json["type"].is_string()
+                                     ? json["type"].get<std::string>()
+                                     : std::string();
+        if (type != "file" && type != "folder" && type != "link") {
             return where + ": \"type\" must be file, folder or link";
         }
-        if (!entry.contains("mode") || !ParseMode(entry["mode"])) {
-            return where + ": \"mode\" must be an octal text such as \"0644\"";
+        entry.type = type == "file"     ? FileEntry::Type::File
+                     : type == "folder" ? FileEntry::Type::Folder
+                                        : FileEntry::Type::Link;
+        const std::set<std::string> keys =
+            type == "link" ? std::set<std::string>{"path", "type", "target"}
+            : type == "folder"
+                ? std::set<std::string>{"path", "type", "mode"}
+                : std::set<std::string>{"path", "type", "mode", "secret", "size", "extents"};
+        for (const auto& [key, value] : json.items()) {
+            (void)value;
+            if (keys.count(key) == 0) return where + ": a " + type + " has no \"" + key + "\"";
         }
-        if (type == "folder") continue;
-        if (!entry.contains("size") || !entry["size"].is_number_integer() ||
-            entry["size"].get<int64_t>() < 0 ||
-            static_cast<uint64_t>(entry["size"].get<int64_t>()) > kMaxFileSize) {
-            return where + ": \"size\" must be a whole number of bytes";
-        }
-        const int64_t size = entry["size"].get<int64_t>();
-        if (!entry.contains("extents") || !entry["extents"].is_array()) {
-            return where + ": \"extents\" must be an array";
-        }
-        for (const auto& extent : entry["extents"]) {
-            if (!extent.is_object() || !extent.contains("offset") ||
-                !extent["offset"].is_number_integer() || extent["offset"].get<int64_t>() < 0 ||
-                !extent.contains("base64") || !extent["base64"].is_string()) {
-                return where + ": an extent needs an \"offset\" and \"base64\" data";
+
+        if (entry.type == FileEntry::Type::Link) {
+            if (!json.contains("target") || !json["target"].is_string()) {
+                return where + ": a link needs a \"target\"";
             }
-            const auto bytes = FromBase64(extent["base64"].get<std::string>());
-            if (!bytes) return where + ": an extent's data is not base64";
-            if (extent["offset"].get<int64_t>() > size - static_cast<int64_t>(bytes->size())) {
-                return where + ": an extent lies beyond the file's size";
+            entry.target = json["target"].get<std::string>();
+            if (!IsInsideFrom(entry.path, entry.target)) {
+                return where + ": a link must point inside the host";
             }
+        } else {
+            const auto mode = json.contains("mode") ? ParseMode(json["mode"]) : std::nullopt;
+            if (!mode) return where + ": \"mode\" must be an octal text such as \"0644\"";
+            entry.mode = *mode;
+        }
+
+        if (entry.type == FileEntry::Type::File) {
+            if (json.contains("secret")) {
+                if (!json["secret"].is_boolean())
+                    return where + ": \"secret\" must be true or false";
+                if (json["secret"].get<bool>() && (entry.mode & 077) != 0) {
+                    return where + ": a secret file must be readable by its owner only";
+                }
+            }
+            if (!json.contains("size") || !json["size"].is_number_integer() ||
+                json["size"].get<int64_t>() < 0 ||
+                static_cast<uint64_t>(json["size"].get<int64_t>()) > kMaxFileSize) {
+                return where + ": \"size\" must be a whole number of bytes";
+            }
+            entry.size = static_cast<off_t>(json["size"].get<int64_t>());
+            if (!json.contains("extents") || !json["extents"].is_array()) {
+                return where + ": \"extents\" must be an array";
+            }
+            off_t end = 0;
+            for (const auto& extent : json["extents"]) {
+                if (!extent.is_object() || extent.size() != 2 || !extent.contains("offset") ||
+                    !extent["offset"].is_number_integer() || extent["offset"].get<int64_t>() < 0 ||
+                    !extent.contains("base64") || !extent["base64"].is_string()) {
+                    return where + ": an extent needs an \"offset\" and \"base64\" data";
+                }
+                auto bytes = FromBase64(extent["base64"].get<std::string>());
+                if (!bytes) return where + ": an extent's data is not base64";
+                const int64_t offset = extent["offset"].get<int64_t>();
+                if (offset >
+                    static_cast<int64_t>(entry.size) - static_cast<int64_t>(bytes->size())) {
+                    return where + ": an extent lies beyond the file's size";
+                }
+                if (offset < end) return where + ": the extents overlap or are out of order";
+                end = static_cast<off_t>(offset + static_cast<int64_t>(bytes->size()));
+                entry.extents.push_back({static_cast<off_t>(offset), std::move(*bytes)});
+            }
+        }
+        const std::string path = entry.path;
+        if (!parsed.emplace(path, std::move(entry)).second) {
+            return where + ": " + path + " given twice";
         }
     }
     // Everything but the top level lives in a folder of the document.
-    for (const auto& [path, type] : types) {
+    for (const auto& [path, entry] : parsed) {
         const std::string parent = fs::path(path).parent_path().generic_string();
         if (parent.empty()) continue;
-        const auto found = types.find(parent);
-        if (found == types.end() || found->second != "folder") {
+        const auto found = parsed.find(parent);
+        if (found == parsed.end() || found->second.type != FileEntry::Type::Folder) {
             return path + " is not in a folder of the document";
         }
     }
+    entries.clear();
+    for (auto& [path, entry] : parsed) entries.push_back(std::move(entry));
     return {};
-}
-
-void ImportFiles(const fs::path& root, const nlohmann::json& files) {
-    std::map<std::string, const nlohmann::json*> wanted;
-    for (const auto& entry : files) wanted.emplace(entry["path"].get<std::string>(), &entry);
-
-    // What the host has and the document does not, deepest first.
-    std::vector<fs::path> unwanted;
-    std::error_code ec;
-    for (fs::recursive_directory_iterator it(root, fs::directory_options::none, ec), end;
-         !ec && it != end; it.increment(ec)) {
-        const fs::path relative = it->path().lexically_relative(root);
-        if (IsBookkeeping(relative)) {
-            if (it->is_directory(ec) && !it->is_symlink(ec)) it.disable_recursion_pending();
-            continue;
-        }
-        if (wanted.count(relative.generic_string()) == 0) {
-            unwanted.push_back(it->path());
-            if (it->is_directory(ec) && !it->is_symlink(ec)) it.disable_recursion_pending();
-        }
-    }
-    if (ec) throw std::system_error(ec, "cannot read " + root.string());
-    for (const auto& path : unwanted) fs::remove_all(path);
-
-    // Sorted, so every folder comes before what it holds.
-    for (const auto& [path, entry] : wanted) {
-        const fs::path target = root / path;
-        const std::string type = (*entry)["type"].get<std::string>();
-        if (type == "folder") {
-            EnsureFolder(target, *ParseMode((*entry)["mode"]));
-        } else if (type == "link") {
-            fs::remove_all(target);
-            fs::create_symlink((*entry)["target"].get<std::string>(), target);
-        } else {
-            struct stat info {};
-            if (::lstat(target.c_str(), &info) == 0 && S_ISDIR(info.st_mode))
-                fs::remove_all(target);
-            std::vector<Extent> extents;
-            for (const auto& extent : (*entry)["extents"]) {
-                extents.push_back({static_cast<off_t>(extent["offset"].get<int64_t>()),
-                                   *FromBase64(extent["base64"].get<std::string>())});
-            }
-            StagedFile(target, extents, *ParseMode((*entry)["mode"]),
-                       static_cast<off_t>((*entry)["size"].get<int64_t>()))
-                .Publish();
-        }
-    }
 }
 
 }  // namespace BrixSim

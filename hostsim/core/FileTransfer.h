@@ -1,24 +1,39 @@
 // The files a host keeps under its root, as entries of an export document, and back.
 #pragma once
 
+#include <sys/types.h>
+
 #include <filesystem>
 #include <nlohmann/json.hpp>
 #include <string>
+#include <vector>
+
+#include "core/DurableWrite.h"
 
 namespace BrixSim {
 
-// Every folder, file and link below `root` but the store's own files, the host marker and the
-// temporaries and locks of writers, sorted by path. A file carries its mode, its size and the
-// bytes of its data extents (holes stay holes: a large sparse file costs what it holds), and is
-// marked secret when only its owner may read it.
+// One file entry of a document, as checked and decoded.
+struct FileEntry {
+    enum class Type { File, Folder, Link };
+    std::string path;  // relative to the root, plain names joined by '/'
+    Type type = Type::File;
+    mode_t mode = 0;              // files and folders
+    std::string target;           // links
+    off_t size = 0;               // files
+    std::vector<Extent> extents;  // files: the data; the rest is a hole
+};
+
+// Every folder, file and link below `root` but what IsLeftOut names, sorted by path. A file
+// carries its mode, its size and the bytes of its data extents (holes stay holes: a large sparse
+// file costs what it holds), and is marked secret when only its owner may read it.
 nlohmann::ordered_json ExportFiles(const std::filesystem::path& root);
 
-// What is wrong with `files` as the file entries of a document, or empty when nothing is.
-std::string CheckFiles(const nlohmann::json& files);
+// Decodes `files`, the file entries of a document, into `entries` (sorted by path, so every
+// folder comes before what it holds). Returns what is wrong with them, or empty when nothing is.
+std::string ParseFiles(const nlohmann::json& files, std::vector<FileEntry>& entries);
 
-// Makes the host's files those of `files` (checked by CheckFiles): entries the host has and the
-// document lacks are removed, the others written as the document has them. Never writes through
-// a link: whatever stands where a folder must be is replaced by the folder.
-void ImportFiles(const std::filesystem::path& root, const nlohmann::json& files);
+// What an export leaves out and an import leaves alone, by its path relative to the root: the
+// store's files, the host's marker, and the temporaries and locks writers hold while writing.
+bool IsLeftOut(const std::filesystem::path& relative);
 
 }  // namespace BrixSim

@@ -3,11 +3,13 @@
 #include <algorithm>
 #include <map>
 #include <nlohmann/json.hpp>
+#include <optional>
 #include <set>
 #include <stdexcept>
 #include <vector>
 
 #include "core/FileTransfer.h"
+#include "core/StagedTree.h"
 #include "core/Store.h"
 
 namespace BrixSim {
@@ -58,22 +60,39 @@ void BindJson(Stmt& stmt, int index, const nlohmann::json& value) {
     }
 }
 
+// Where in `value` the first text that is not UTF-8 lies, as a JSON pointer ("/files/3/path").
+std::string NonUtf8Text(const nlohmann::ordered_json& value, const std::string& at) {
+    if (value.is_string()) {
+        try {
+            (void)value.dump();
+        } catch (const nlohmann::json::type_error&) {
+            return at;
+        }
+    } else if (value.is_object()) {
+        // Keys are the store's own table and column names.
+        for (const auto& [key, member] : value.items()) {
+            if (auto found = NonUtf8Text(member, at + "/" + key); !found.empty()) return found;
+        }
+    } else if (value.is_array()) {
+        for (size_t index = 0; index < value.size(); ++index) {
+            if (auto found = NonUtf8Text(value[index], at + "/" + std::to_string(index));
+                !found.empty()) {
+                return found;
+            }
+        }
+    }
+    return {};
+}
+
 }  // namespace
 
 std::string ExportState(Store& store) {
     nlohmann::ordered_json document;
     document["version"] = kFormatVersion;
     auto& tables = document["tables"] = nlohmann::ordered_json::object();
-    // The write lock, so the document is one state of the host: writers publish their files
-    // while they hold it, and none can start meanwhile. A host this process cannot write has
-    // no writers to keep out, and is read in a plain read transaction.
-    try {
-        store.Exec("BEGIN IMMEDIATE");
-    } catch (const StoreError& error) {
-        if ((error.Code() & 0xff) != 8 /* SQLITE_READONLY */) throw;
-        store.Exec("BEGIN");
-    }
-    try {
+    // The tables and the files as of one moment: every writer publishes its files while it
+    // holds the write lock, which this read holds too.
+    store.ReadExclusive([&] {
         for (const auto& table : StateTables(store)) {
             auto& rows = tables[table] = nlohmann::ordered_json::array();
             auto stmt = store.Prepare("SELECT * FROM " + Quote(table));
@@ -98,19 +117,15 @@ std::string ExportState(Store& store) {
                 rows.push_back(std::move(row));
             }
         }
-    } catch (...) {
-        store.Exec("ROLLBACK");
-        throw;
-    }
-    // The files, under the same lock.
-    try {
         document["files"] = ExportFiles(store.Root());
-    } catch (...) {
-        store.Exec("ROLLBACK");
-        throw;
+    });
+    try {
+        return document.dump(2);
+    } catch (const nlohmann::json::type_error&) {
+        // A name or a value a JSON text cannot hold as it is: refused rather than altered.
+        throw std::runtime_error("cannot export: the text at " + NonUtf8Text(document, "") +
+                                 " is not UTF-8");
     }
-    store.Exec("COMMIT");
-    return document.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
 }
 
 ImportResult ImportState(std::string_view text, const std::function<Store&()>& openStore) {
@@ -134,10 +149,17 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
         return invalid("\"tables\" must be an object");
     }
     const bool withFiles = document["version"] == kFormatVersion;
+    std::vector<FileEntry> files;
     if (withFiles) {
         if (!document.contains("files")) return invalid("\"files\" is missing");
-        if (const std::string problem = CheckFiles(document["files"]); !problem.empty()) {
+        if (const std::string problem = ParseFiles(document["files"], files); !problem.empty()) {
             return invalid(problem);
+        }
+    }
+    for (const auto& [key, value] : document.items()) {
+        (void)value;
+        if (key != "version" && key != "tables" && (key != "files" || !withFiles)) {
+            return invalid("the document has no \"" + key + "\"");
         }
     }
     Store& store = openStore();
@@ -168,8 +190,12 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
             }
         }
     }
+    bool replacingFiles = false;
     try {
         store.Write([&] {
+            // Every file is written out before anything changes, so a full disk changes nothing.
+            std::optional<StagedTree> staged;
+            if (withFiles) staged.emplace(store.Root(), files);
             // Tables are replaced one after another; references between them are checked
             // once all are in place.
             store.Exec("PRAGMA defer_foreign_keys=ON");
@@ -200,9 +226,11 @@ ImportResult ImportState(std::string_view text, const std::function<Store&()>& o
                 }
             }
             // Last, so that a table the store refuses leaves the files untouched too.
-            if (withFiles) ImportFiles(store.Root(), document["files"]);
+            replacingFiles = withFiles;
+            if (staged) staged->Apply();
         });
     } catch (const std::runtime_error& e) {
+        if (replacingFiles) return {ImportResult::Status::Failed, e.what()};
         return invalid(e.what());
     }
     return {};

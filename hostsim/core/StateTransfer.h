@@ -19,14 +19,17 @@ struct ImportResult {
         Applied,  // every table the document holds was replaced
         NotJson,  // the text is not JSON; `message` is the parser's reason
         Refused,  // nothing changed; `message` says why
+        Failed,   // the files could not all be put in place: the tables are as they were, the
+                  // files partly the document's; `message` says why
     };
     Status status = Status::Applied;
     std::string message;
 };
 
 // Replaces the tables the document holds with its rows, in one transaction: either all of them
-// or none; a version 2 document then makes the host's files its own (core/FileTransfer.h).
-// A document that cannot be applied whole is refused before anything changes. `store` is asked for
+// or none; a version 2 document then makes the host's files its own (core/StagedTree.h), every
+// file written out before the first change. A document that cannot be applied whole is refused
+// before anything changes. `store` is asked for
 // only once the document's overall shape is right, so a malformed document never opens (or creates)
 // a host.
 ImportResult ImportState(std::string_view text, const std::function<Store&()>& store);

@@ -851,4 +851,27 @@ void Store::JournalCall(const Operation& operation, const std::vector<Value>& ar
     Prepare("INSERT INTO journal (record) VALUES (?)").Bind(1, text).Run();
 }
 
+void Store::ReadExclusive(const std::function<void()>& work) {
+    if (writeDepth_ > 0 || readDepth_ > 0) {
+        // Inside a write the lock is held already; a read cannot take it.
+        if (writeDepth_ == 0) throw StoreError("host store: an exclusive read inside a read", 0);
+        work();
+        return;
+    }
+    Exec(readOnly_ ? "BEGIN" : "BEGIN IMMEDIATE");
+    readDepth_ = 1;
+    readSnapshot_ = NextReadSnapshot();
+    try {
+        work();
+    } catch (...) {
+        readDepth_ = 0;
+        readSnapshot_ = 0;
+        sqlite3_exec(db_, "ROLLBACK", nullptr, nullptr, nullptr);
+        throw;
+    }
+    readDepth_ = 0;
+    readSnapshot_ = 0;
+    Exec("COMMIT");
+}
+
 }  // namespace BrixSim

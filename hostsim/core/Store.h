@@ -191,6 +191,13 @@ class Store {
     // The operations with a fault armed, as read in the read transaction `faultsSnapshot_`.
     uint64_t faultsSnapshot_ = 0;
     std::set<std::string, std::less<>> armedFaults_;
+
+  public:
+    // Runs `work` in a read transaction that also holds the write lock, so no other process
+    // commits, nor publishes a file it writes under that lock, until it ends: what a reader of
+    // the tables and the files at once needs. Writes nothing. On a host this process cannot
+    // write, nobody can change anything, and a plain read transaction serves.
+    void ReadExclusive(const std::function<void()>& work);
 };
 
 }  // namespace BrixSim

@@ -286,6 +286,11 @@ int Import(const Args& args) {
         case BrixSim::ImportResult::Status::NotJson:
             std::cerr << "brixsim: " << args[0] << " is not JSON: " << result.message << "\n";
             return 1;
+        case BrixSim::ImportResult::Status::Failed:
+            std::cerr << "brixsim: import failed, the tables are as they were, the files may be "
+                         "partly the document's: "
+                      << result.message << "\n";
+            return 1;
         case BrixSim::ImportResult::Status::Refused:
             break;
     }
