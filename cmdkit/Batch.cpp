@@ -19,22 +19,31 @@ bool IsBlank(char c) {
 
 // One line as NDJSON: the line's number and text, its status, its messages and its result (the
 // result as the json formatter gives it, a printed text as a string, or null).
-void PrintJsonLine(size_t number, const std::string& line, const Outcome& outcome,
-                   std::ostream& out) {
+// Returns the line's status: the outcome's, or 1 when the result's rows could not all be read.
+int PrintJsonLine(size_t number, const std::string& line, const Outcome& outcome,
+                  std::ostream& out) {
     nlohmann::ordered_json document;
     document["line"] = number;
     document["input"] = line;
-    document["status"] = outcome.status;
-    document["messages"] = outcome.messages;
+    int status = outcome.status;
+    auto messages = outcome.messages;
+    nlohmann::ordered_json result = nullptr;
     if (outcome.result) {
-        document["result"] = ResultJson(*outcome.result, outcome.context.prototype.get());
+        try {
+            result = ResultJson(*outcome.result, outcome.context.prototype.get());
+        } catch (const std::exception& error) {
+            messages.push_back(RowFailureLine(error));
+            status = 1;
+        }
     } else if (!outcome.text.empty()) {
-        document["result"] = outcome.text;
-    } else {
-        document["result"] = nullptr;
+        result = outcome.text;
     }
+    document["status"] = status;
+    document["messages"] = messages;
+    document["result"] = std::move(result);
     out << document.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) << '\n';
     out.flush();
+    return status;
 }
 
 }  // namespace
@@ -106,13 +115,10 @@ int RunBatch(const AutoCli::Program& program, const std::shared_ptr<AutoCli::Nam
             outcome.status = 2;
             outcome.messages = {error.what()};
         }
-        if (json) {
-            PrintJsonLine(number, line, outcome, out);
-        } else {
-            Print(outcome, out, err, "line " + std::to_string(number) + ": ");
-        }
-        worst = std::max(worst, outcome.status);
-        if (outcome.status != 0 && batch.stopOnError) return worst;
+        const int status = json ? PrintJsonLine(number, line, outcome, out)
+                                : Print(outcome, out, err, "line " + std::to_string(number) + ": ");
+        worst = std::max(worst, status);
+        if (status != 0 && batch.stopOnError) return worst;
     }
     if (in->bad()) {
         err << "Error: Cannot read " << (batch.file == "-" ? "standard input" : batch.file)

@@ -368,8 +368,7 @@ int Run(const Program& program, const std::shared_ptr<NamespaceNode>& root,
     });
     // A dry run stops before the commands, so before reading the batch's file.
     if (batch) return execute ? Detail::RunBatch(program, root, *batch, out, err) : 0;
-    Detail::Print(outcome, out, err);
-    return outcome.status;
+    return Detail::Print(outcome, out, err);
 }
 
 }  // namespace
@@ -403,24 +402,37 @@ Outcome RunLine(const AutoCli::Program& program,
     });
 }
 
-void Print(const Outcome& outcome, std::ostream& out, std::ostream& err,
-           const std::string& prefix) {
-    for (const auto& message : outcome.messages) {
+std::string RowFailureLine(const std::exception& error) {
+    if (dynamic_cast<const MetaObj::RowError*>(&error)) return MessageLine(error.what());
+    return MessageLine("Error: " + std::string(error.what()));
+}
+
+int Print(const Outcome& outcome, std::ostream& out, std::ostream& err, const std::string& prefix) {
+    auto writeMessage = [&](const std::string& message) {
         if (prefix.empty()) {
             err << message << '\n';
-            continue;
+            return;
         }
         std::istringstream lines(message);
         for (std::string line; std::getline(lines, line);) err << prefix << line << '\n';
-    }
+    };
+    for (const auto& message : outcome.messages) writeMessage(message);
+    int status = outcome.status;
     if (outcome.result) {
         FormatContext context = outcome.context;
         context.terminalWidth = AutoCli::TerminalWidth(out);
-        Format(outcome.formatter, *outcome.result, context, out);
+        try {
+            Format(outcome.formatter, *outcome.result, context, out);
+        } catch (const std::exception& error) {
+            out.flush();
+            writeMessage(RowFailureLine(error));
+            status = 1;
+        }
     } else {
         out << outcome.text;
     }
     out.flush();
+    return status;
 }
 
 }  // namespace CmdKit::Detail

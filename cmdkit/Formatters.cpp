@@ -1,6 +1,7 @@
 // The output formatters: simple, table, json, xml, csv and keyvalue.
 #include <algorithm>
 #include <boost/algorithm/string/trim.hpp>
+#include <functional>
 #include <map>
 #include <nlohmann/json.hpp>
 #include <ostream>
@@ -121,10 +122,10 @@ std::string InlineText(const MetaObject* object) {
             return static_cast<const MetaBool*>(object)->GetValue() ? "true" : "false";
         case MetaObj::META_LIST: {
             std::string text;
-            for (const auto& element : static_cast<const MetaList*>(object)->GetElements()) {
+            static_cast<const MetaList*>(object)->ForEach([&](const MetaObject& element) {
                 if (!text.empty()) text += ", ";
-                text += InlineText(element.get());
-            }
+                text += InlineText(&element);
+            });
             return text;
         }
         case MetaObj::META_STRUCT: {
@@ -175,10 +176,10 @@ void SimpleField(const std::string& name, const MetaObject* value, const MetaObj
     if (list && list->GetElementType() == MetaObj::META_STRUCT) {
         out << pad << name << ":\n";
         const MetaStruct* elementPrototype = ElementPrototype(*list, declared);
-        for (const auto& element : list->GetElements()) {
-            SimpleStruct(static_cast<const MetaStruct&>(*element), elementPrototype, hints,
+        list->ForEach([&](const MetaObject& element) {
+            SimpleStruct(static_cast<const MetaStruct&>(element), elementPrototype, hints,
                          indent + 3, false, out);
-        }
+        });
         return;
     }
     const std::string text = ScreenText(WithUnit(InlineText(value), hints, structName, name));
@@ -209,15 +210,15 @@ void FormatSimple(const MetaObject& result, const FormatContext& context, std::o
     if (const MetaList* list = AsList(&result)) {
         const MetaStruct* prototype = ElementPrototype(*list, context.prototype.get());
         bool first = true;
-        for (const auto& element : list->GetElements()) {
-            if (const MetaStruct* row = AsStruct(element.get())) {
+        list->ForEach([&](const MetaObject& element) {
+            if (const MetaStruct* row = AsStruct(&element)) {
                 if (!first) out << '\n';
                 SimpleStruct(*row, prototype, context.hints, 0, false, out);
             } else {
-                out << ScreenText(InlineText(element.get())) << '\n';
+                out << ScreenText(InlineText(&element)) << '\n';
             }
             first = false;
-        }
+        });
         return;
     }
     out << ScreenText(InlineText(&result)) << '\n';
@@ -258,8 +259,10 @@ void WriteLine(std::string line, size_t cut, std::ostream& out) {
 
 void FormatTable(const MetaList& list, const FormatContext& context, std::ostream& out) {
     const MetaStruct* prototype = ElementPrototype(list, context.prototype.get());
-    const MetaStruct* first =
-        list.GetElements().empty() ? nullptr : AsStruct(list.GetElements().front().get());
+    // A streamed list's prototype names every field; only a list in memory has a first row to ask.
+    const MetaStruct* first = list.IsStreamed() || list.GetElements().empty()
+                                  ? nullptr
+                                  : AsStruct(list.GetElements().front().get());
     // A prototype without fields (only a name) leaves the columns to the first row.
     const MetaStruct* shape = prototype && !prototype->GetFields().empty() ? prototype : first;
     if (!shape) shape = prototype;
@@ -271,28 +274,28 @@ void FormatTable(const MetaList& list, const FormatContext& context, std::ostrea
         for (const auto& field : shape->GetFields()) columns.push_back(field.name);
     }
 
-    std::vector<std::vector<std::string>> rows;
     std::vector<std::string> header;
     for (const auto& column : columns) {
         const std::string unit = Hint(context.hints, "units:" + structName + "." + column);
         header.push_back(unit.empty() ? column : column + " (" + unit + ")");
     }
-    rows.reserve(list.Size());
-    for (const auto& element : list.GetElements()) {
-        const MetaStruct* row = AsStruct(element.get());
-        std::vector<std::string> cells;
-        cells.reserve(columns.size());
-        for (const auto& column : columns) {
-            cells.push_back(row ? OneLine(InlineText(row->GetField(column).get())) : "");
+    // The rows are walked twice, their cells made afresh each time: once for the column widths,
+    // once to print. Only one row is held at a time.
+    std::vector<std::string> cells(columns.size());
+    auto cellsOf = [&](const MetaObject& element) -> const std::vector<std::string>& {
+        const MetaStruct* row = AsStruct(&element);
+        for (size_t i = 0; i < columns.size(); ++i) {
+            cells[i] = row ? OneLine(InlineText(row->GetField(columns[i]).get())) : "";
         }
-        rows.push_back(std::move(cells));
-    }
+        return cells;
+    };
 
     std::vector<size_t> widths;
     for (const auto& title : header) widths.push_back(title.size());
-    for (const auto& row : rows) {
+    list.ForEach([&](const MetaObject& element) {
+        const auto& row = cellsOf(element);
         for (size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
-    }
+    });
     if (columns.empty()) return;
 
     // Where the last column starts, and how much room a terminal leaves it.
@@ -308,7 +311,9 @@ void FormatTable(const MetaList& list, const FormatContext& context, std::ostrea
         std::string line;
         for (size_t i = 0; i + 1 < cells.size(); ++i) {
             line += cells[i];
-            line.append(widths[i] - cells[i].size() + 2, ' ');
+            // A row that has grown since the widths were measured (the host changed under a
+            // fault's count) pushes its line right rather than breaking it.
+            line.append(widths[i] > cells[i].size() ? widths[i] - cells[i].size() + 2 : 2, ' ');
         }
         if (!wrap) {
             WriteLine(line + cells.back(), cut, out);
@@ -329,7 +334,7 @@ void FormatTable(const MetaList& list, const FormatContext& context, std::ostrea
         dashes.push_back(std::string(width, '-'));
     }
     writeRow(dashes);
-    for (const auto& row : rows) writeRow(row);
+    list.ForEach([&](const MetaObject& element) { writeRow(cellsOf(element)); });
 }
 
 // --- json ---
@@ -352,9 +357,9 @@ Json ToJson(const MetaObject* object, const MetaObject* prototype) {
             const auto* list = static_cast<const MetaList*>(object);
             const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
             Json array = Json::array();
-            for (const auto& element : list->GetElements()) {
-                array.push_back(ToJson(element.get(), elementPrototype));
-            }
+            list->ForEach([&](const MetaObject& element) {
+                array.push_back(ToJson(&element, elementPrototype));
+            });
             return array;
         }
         case MetaObj::META_STRUCT: {
@@ -399,9 +404,8 @@ void ToXml(const MetaObject* object, const MetaObject* prototype, pugi::xml_node
             node.append_attribute("type") =
                 list->GetElementType() == MetaObj::META_STRUCT ? "structure" : "string";
             const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
-            for (const auto& element : list->GetElements()) {
-                ToXml(element.get(), elementPrototype, node);
-            }
+            list->ForEach(
+                [&](const MetaObject& element) { ToXml(&element, elementPrototype, node); });
             return;
         }
         case MetaObj::META_STRUCT: {
@@ -450,50 +454,54 @@ std::string CsvCell(const std::string& text) {
     return quoted + "\"";
 }
 
-void CsvRows(const std::vector<const MetaStruct*>& rows, const MetaStruct* prototype,
-             std::ostream& out) {
+// The rows are walked twice: once for the columns (the prototype's, then any other field a row
+// has), once to print.
+void CsvRows(const std::function<void(const std::function<void(const MetaStruct&)>&)>& eachRow,
+             const MetaStruct* prototype, std::ostream& out) {
     std::vector<std::string> columns;
     if (prototype) {
         for (const auto& field : prototype->GetFields()) columns.push_back(field.name);
     }
-    for (const auto* row : rows) {
-        for (const auto& field : row->GetFields()) {
+    eachRow([&](const MetaStruct& row) {
+        for (const auto& field : row.GetFields()) {
             if (std::find(columns.begin(), columns.end(), field.name) == columns.end()) {
                 columns.push_back(field.name);
             }
         }
-    }
+    });
     if (columns.empty()) return;
     auto writeLine = [&](const std::vector<std::string>& cells) {
         for (size_t i = 0; i < cells.size(); ++i) out << (i ? "," : "") << CsvCell(cells[i]);
         out << '\n';
     };
     writeLine(columns);
-    for (const auto* row : rows) {
-        std::vector<std::string> cells;
-        for (const auto& column : columns) cells.push_back(InlineText(row->GetField(column).get()));
+    std::vector<std::string> cells(columns.size());
+    eachRow([&](const MetaStruct& row) {
+        for (size_t i = 0; i < columns.size(); ++i) {
+            cells[i] = InlineText(row.GetField(columns[i]).get());
+        }
         writeLine(cells);
-    }
+    });
 }
 
 void FormatCsv(const MetaObject& result, const FormatContext& context, std::ostream& out) {
     if (const MetaStruct* object = AsStruct(&result)) {
         const MetaStruct* declared = AsStruct(context.prototype.get());
-        CsvRows({object}, declared ? declared : object, out);
+        CsvRows([&](const auto& row) { row(*object); }, declared ? declared : object, out);
         return;
     }
     if (const MetaList* list = AsList(&result)) {
         if (list->GetElementType() == MetaObj::META_STRUCT) {
-            std::vector<const MetaStruct*> rows;
-            for (const auto& element : list->GetElements()) {
-                if (const MetaStruct* row = AsStruct(element.get())) rows.push_back(row);
-            }
-            CsvRows(rows, ElementPrototype(*list, context.prototype.get()), out);
+            auto eachRow = [&](const std::function<void(const MetaStruct&)>& row) {
+                list->ForEach([&](const MetaObject& element) {
+                    if (const MetaStruct* structure = AsStruct(&element)) row(*structure);
+                });
+            };
+            CsvRows(eachRow, ElementPrototype(*list, context.prototype.get()), out);
             return;
         }
-        for (const auto& element : list->GetElements()) {
-            out << CsvCell(InlineText(element.get())) << '\n';
-        }
+        list->ForEach(
+            [&](const MetaObject& element) { out << CsvCell(InlineText(&element)) << '\n'; });
         return;
     }
     out << CsvCell(InlineText(&result)) << '\n';
@@ -529,15 +537,12 @@ void KeyValue(const std::string& key, const MetaObject* object, const MetaObject
         return;
     }
     if (const MetaList* list = AsList(object)) {
-        if (list->GetElements().empty()) {
-            out << key << "=\n";
-            return;
-        }
         const MetaStruct* elementPrototype = ElementPrototype(*list, prototype);
-        for (size_t i = 0; i < list->Size(); ++i) {
-            KeyValue(key + "[" + std::to_string(i) + "]", list->GetElements()[i].get(),
-                     elementPrototype, out);
-        }
+        size_t index = 0;
+        list->ForEach([&](const MetaObject& element) {
+            KeyValue(key + "[" + std::to_string(index++) + "]", &element, elementPrototype, out);
+        });
+        if (index == 0) out << key << "=\n";
         return;
     }
     out << key << '=' << Escape(InlineText(object)) << '\n';
@@ -552,12 +557,13 @@ void FormatKeyValue(const MetaObject& result, const FormatContext& context, std:
         case MetaObj::META_LIST: {
             const auto& list = static_cast<const MetaList&>(result);
             const MetaStruct* elementPrototype = ElementPrototype(list, prototype);
-            for (size_t i = 0; i < list.Size(); ++i) {
-                const MetaObject* element = list.GetElements()[i].get();
-                const MetaStruct* row = AsStruct(element);
+            size_t index = 0;
+            list.ForEach([&](const MetaObject& element) {
+                const MetaStruct* row = AsStruct(&element);
                 const std::string name = row ? row->GetName() : std::string("String");
-                KeyValue(name + "[" + std::to_string(i) + "]", element, elementPrototype, out);
-            }
+                KeyValue(name + "[" + std::to_string(index++) + "]", &element, elementPrototype,
+                         out);
+            });
             return;
         }
         case MetaObj::META_STRING:
@@ -572,17 +578,64 @@ void FormatKeyValue(const MetaObject& result, const FormatContext& context, std:
     }
 }
 
+std::string JsonText(const Json& json) {
+    return json.dump(2, ' ', false, nlohmann::json::error_handler_t::replace);
+}
+
+// `text` with every line moved right by `indent` spaces.
+void WriteIndented(const std::string& text, size_t indent, std::ostream& out) {
+    const std::string pad(indent, ' ');
+    size_t start = 0;
+    for (size_t end = text.find('\n'); end != std::string::npos; end = text.find('\n', start)) {
+        out << pad;
+        out.write(text.data() + start, static_cast<std::streamsize>(end - start + 1));
+        start = end + 1;
+    }
+    out << pad << std::string_view(text).substr(start);
+}
+
+// A list is written element by element, as the whole document would show it; nothing is written
+// before its first element is ready, so a list that fails at once leaves no partial document.
 void FormatJson(const MetaObject& result, const FormatContext& context, std::ostream& out) {
-    out << ToJson(&result, context.prototype.get())
-               .dump(2, ' ', false, nlohmann::json::error_handler_t::replace)
-        << '\n';
+    const MetaList* list = AsList(&result);
+    if (!list) {
+        out << JsonText(ToJson(&result, context.prototype.get())) << '\n';
+        return;
+    }
+    const MetaStruct* prototype = ElementPrototype(*list, context.prototype.get());
+    bool any = false;
+    list->ForEach([&](const MetaObject& element) {
+        const std::string text = JsonText(ToJson(&element, prototype));
+        out << (any ? ",\n" : "[\n");
+        WriteIndented(text, 2, out);
+        any = true;
+    });
+    out << (any ? "\n]\n" : "[]\n");
 }
 
 void FormatXml(const MetaObject& result, const FormatContext& context, std::ostream& out) {
-    pugi::xml_document document;
-    ToXml(&result, context.prototype.get(), document.append_child("output"));
     XmlWriter writer(out);
-    document.save(writer, "  ", pugi::format_default, pugi::encoding_utf8);
+    const MetaList* list = AsList(&result);
+    if (!list) {
+        pugi::xml_document document;
+        ToXml(&result, context.prototype.get(), document.append_child("output"));
+        document.save(writer, "  ", pugi::format_default, pugi::encoding_utf8);
+        return;
+    }
+    const char* const type =
+        list->GetElementType() == MetaObj::META_STRUCT ? "structure" : "string";
+    const std::string opening =
+        std::string("<?xml version=\"1.0\"?>\n<output>\n  <list type=\"") + type + "\"";
+    const MetaStruct* prototype = ElementPrototype(*list, context.prototype.get());
+    bool any = false;
+    list->ForEach([&](const MetaObject& element) {
+        pugi::xml_document piece;
+        ToXml(&element, prototype, piece);
+        if (!any) out << opening << ">\n";
+        piece.first_child().print(writer, "  ", pugi::format_default, pugi::encoding_utf8, 2);
+        any = true;
+    });
+    out << (any ? "  </list>\n</output>\n" : opening + " />\n</output>\n");
 }
 
 // A table needs a list of structures; any other result is printed as simple prints it.

@@ -30,9 +30,13 @@ Outcome RunLine(const AutoCli::Program& program,
                 const std::vector<std::string>& words, const std::string& formatter);
 
 // Writes the messages to `err`, each of their lines after `prefix`, then the result or the text
-// to `out`, and flushes `out`.
-void Print(const Outcome& outcome, std::ostream& out, std::ostream& err,
-           const std::string& prefix = std::string());
+// to `out`, and flushes `out`. Returns the outcome's status, or 1 when the result's rows could not
+// all be read while it was written (the reason then follows on `err`).
+int Print(const Outcome& outcome, std::ostream& out, std::ostream& err,
+          const std::string& prefix = std::string());
+
+// The message line of a failure to read a result's rows while it is written.
+std::string RowFailureLine(const std::exception& error);
 
 struct Batch {
     std::string file;  // "-": standard input

@@ -135,6 +135,38 @@ std::shared_ptr<MetaList> MetaList::New(int elementType, std::shared_ptr<MetaStr
     return std::shared_ptr<MetaList>(new MetaList(elementType, std::move(prototype)));
 }
 
+std::shared_ptr<MetaList> MetaList::New(std::shared_ptr<MetaStruct> prototype,
+                                        std::shared_ptr<RowSource> rows) {
+    if (!prototype || !rows) throw CmdKitException("A streamed list needs a prototype and rows");
+    auto list = New(META_STRUCT, std::move(prototype));
+    list->rows_ = std::move(rows);
+    return list;
+}
+
+void MetaList::ForEach(const std::function<void(const MetaObject&)>& element) const {
+    if (rows_) {
+        rows_->Each([&](std::shared_ptr<MetaStruct> row) {
+            if (!row) throw CmdKitException("A row source gave a null row");
+            element(*row);
+        });
+        return;
+    }
+    for (const auto& each : elements_) element(*each);
+}
+
+const std::vector<std::shared_ptr<MetaObject>>& MetaList::GetElements() const {
+    if (rows_) {
+        std::vector<std::shared_ptr<MetaObject>> all;
+        rows_->Each([&](std::shared_ptr<MetaStruct> row) {
+            if (!row) throw CmdKitException("A row source gave a null row");
+            all.push_back(std::move(row));
+        });
+        elements_ = std::move(all);
+        rows_.reset();
+    }
+    return elements_;
+}
+
 void MetaList::Add(const std::string& text) {
     Add(MetaString::New(text));
 }
@@ -149,6 +181,7 @@ void MetaList::Add(std::shared_ptr<MetaString> text) {
 
 void MetaList::Add(std::shared_ptr<MetaStruct> row) {
     if (!row) throw CmdKitException("Cannot add a null structure to a list");
+    if (rows_) throw CmdKitException("Cannot add to a list read from a row source");
     if (elementType_ != META_STRUCT) {
         throw CmdKitException("Cannot add a structure to a list of strings");
     }

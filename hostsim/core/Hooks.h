@@ -10,12 +10,14 @@
 namespace BrixSim {
 
 // A kernel system-information node: `get` fills exactly `size` bytes of the record of the
-// instance named by `instancePath` (empty for the node's only record), `list` names the
-// instances below it. Both may throw HostCtl::Lib::HostCtlException.
+// instance named by `instancePath` (empty for the node's only record), `each` names the
+// instances below it one at a time, in order. Both may throw HostCtl::Lib::HostCtlException.
 struct SysinfoNode {
     std::function<void(const std::vector<std::string>& instancePath, void* buffer, size_t size)>
         get;
-    std::function<std::vector<std::string>(const std::vector<std::string>& instancePath)> list;
+    std::function<void(const std::vector<std::string>& instancePath,
+                       const std::function<void(const std::string& name)>& name)>
+        each;
 };
 bool RegisterSysinfoNode(uint32_t node, SysinfoNode handler);
 

@@ -388,14 +388,34 @@ void Store::Read(const std::function<void()>& work) {
     try {
         work();
     } catch (...) {
-        readDepth_ = 0;
-        readSnapshot_ = 0;
-        sqlite3_exec(db_, "COMMIT", nullptr, nullptr, nullptr);
+        EndRead(false);
         throw;
     }
-    readDepth_ = 0;
+    EndRead(true);
+}
+
+void Store::EndRead(bool checked) {
+    if (readDepth_ == 0 || --readDepth_ > 0) return;
     readSnapshot_ = 0;
-    Exec("COMMIT");
+    if (checked) {
+        Exec("COMMIT");
+    } else {
+        sqlite3_exec(db_, "COMMIT", nullptr, nullptr, nullptr);
+    }
+}
+
+Store::ReadHold::ReadHold(Store& store) : store_(store) {
+    if (store.writeDepth_ > 0) return;
+    if (store.readDepth_ == 0) {
+        store.Exec("BEGIN");
+        store.readSnapshot_ = NextReadSnapshot();
+    }
+    ++store.readDepth_;
+    holds_ = true;
+}
+
+Store::ReadHold::~ReadHold() {
+    if (holds_ && store_.writeDepth_ == 0) store_.EndRead(false);
 }
 
 namespace {

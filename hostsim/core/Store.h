@@ -149,6 +149,21 @@ class Store {
     // what an area may key a cache of rows on, as the rows cannot change until it changes.
     uint64_t ReadSnapshot() const { return writeDepth_ == 0 ? readSnapshot_ : 0; }
 
+    // Holds one read transaction, as Read does, for as long as it lives: for rows read after the
+    // call that asked for them returns (a listing printed as it is read). Taken inside a Read it
+    // keeps that transaction open after the Read returns; inside a write it holds nothing.
+    class ReadHold {
+      public:
+        explicit ReadHold(Store& store);
+        ~ReadHold();
+        ReadHold(const ReadHold&) = delete;
+        ReadHold& operator=(const ReadHold&) = delete;
+
+      private:
+        Store& store_;
+        bool holds_ = false;
+    };
+
     // The statements are prepared once per store and kept (SQLite's parser costs more than
     // most of the queries); a statement in use when asked for again is prepared afresh.
     Stmt Prepare(std::string_view sql);
@@ -198,6 +213,11 @@ class Store {
     // the tables and the files at once needs. Writes nothing. On a host this process cannot
     // write, nobody can change anything, and a plain read transaction serves.
     void ReadExclusive(const std::function<void()>& work);
+
+  private:
+    // Ends one part in the read transaction; the last part ends it (`checked`: a failure to end
+    // it is reported).
+    void EndRead(bool checked);
 };
 
 }  // namespace BrixSim

@@ -36,13 +36,19 @@ void Sysinfo::Get(void* buffer, size_t size) {
 }
 
 void Sysinfo::List(std::vector<std::string>& names) {
+    std::vector<std::string> listed;
+    Each([&](const std::string& name) { listed.push_back(name); });
+    names = std::move(listed);
+}
+
+void Sysinfo::Each(const std::function<void(const std::string& name)>& name) {
     BrixSim::Store::Get().Check(kList);
     const auto& node = Node(node_);
-    if (!node.list) {
+    if (!node.each) {
         throw HostCtl::Lib::HostCtlException("KSI node " + std::to_string(node_) +
                                              " has no instances");
     }
-    names = node.list(instancePath_);
+    node.each(instancePath_, name);
 }
 
 void Sysinfo::ResetInstance() {

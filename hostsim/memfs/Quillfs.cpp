@@ -139,17 +139,17 @@ void RequireInstance(const char* node, const std::vector<std::string>& instanceP
     }
 }
 
-std::vector<std::string> ListNames(const char* table, const std::vector<std::string>& path) {
-    std::vector<std::string> names;
-    if (!path.empty()) return names;
-    auto rows = Store::Get().Prepare(std::string("SELECT name FROM ") + table + " ORDER BY id");
-    while (rows.Step()) names.push_back(rows.Text(0));
-    return names;
+// The instances of a node listed by `table`.
+auto NamesIn(const char* table) {
+    return [table](const std::vector<std::string>& path,
+                   const std::function<void(const std::string&)>& name) {
+        if (!path.empty()) return;
+        auto rows = Store::Get().Prepare(std::string("SELECT name FROM ") + table + " ORDER BY id");
+        while (rows.Step()) name(rows.Text(0));
+    };
 }
 
-std::vector<std::string> NoInstances(const std::vector<std::string>&) {
-    return {};
-}
+void NoInstances(const std::vector<std::string>&, const std::function<void(const std::string&)>&) {}
 
 void NoRecord(const char* node) {
     throw HostCtlException(std::string("Sysinfo node ") + node + " has no record");
@@ -215,19 +215,17 @@ void GetTardisk(const std::vector<std::string>& instancePath, void* buffer, size
 
 const bool registered = [] {
     BrixSim::RegisterSysinfoNode(KSI_NODE_system_quillfs_stats, {GetStatus, NoInstances});
-    BrixSim::RegisterSysinfoNode(
-        KSI_NODE_system_quillfs_ramdisks,
-        {[](const std::vector<std::string>&, void*, size_t) {
-             NoRecord("system.quillfs.ramdisks");
-         },
-         [](const std::vector<std::string>& path) { return ListNames("quillfs_ramdisks", path); }});
+    BrixSim::RegisterSysinfoNode(KSI_NODE_system_quillfs_ramdisks,
+                                 {[](const std::vector<std::string>&, void*, size_t) {
+                                      NoRecord("system.quillfs.ramdisks");
+                                  },
+                                  NamesIn("quillfs_ramdisks")});
     BrixSim::RegisterSysinfoNode(KSI_NODE_system_quillfs_ramdisks_stats, {GetRamdisk, NoInstances});
-    BrixSim::RegisterSysinfoNode(
-        KSI_NODE_system_quillfs_tardisks,
-        {[](const std::vector<std::string>&, void*, size_t) {
-             NoRecord("system.quillfs.tardisks");
-         },
-         [](const std::vector<std::string>& path) { return ListNames("quillfs_tardisks", path); }});
+    BrixSim::RegisterSysinfoNode(KSI_NODE_system_quillfs_tardisks,
+                                 {[](const std::vector<std::string>&, void*, size_t) {
+                                      NoRecord("system.quillfs.tardisks");
+                                  },
+                                  NamesIn("quillfs_tardisks")});
     BrixSim::RegisterSysinfoNode(KSI_NODE_system_quillfs_tardisks_stats, {GetTardisk, NoInstances});
     return BrixSim::RegisterTables({"memfs", kSchema, Seed});
 }();

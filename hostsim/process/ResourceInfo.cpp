@@ -68,6 +68,28 @@ class WorldImpl final : public HostCtl::Resource::World {
     std::string name_, commandLine_;
 };
 
+// The listing's records through the system-information nodes, one at a time, all in the read
+// transaction the list holds.
+class WorldListImpl final : public HostCtl::Resource::WorldList {
+  public:
+    WorldListImpl() : hold_(BrixSim::Store::Get()) {}
+
+    void Each(const std::function<void(const HostCtl::Resource::World&)>& world) override {
+        KernCtl::Util::Sysinfo list(KSI_NODE_system_worlds);
+        KernCtl::Util::Sysinfo info(KSI_NODE_system_worlds_info);
+        unsigned char record[R::kSize];
+        list.Each([&](const std::string& id) {
+            info.ResetInstance();
+            info.AddInstancePath(id);
+            info.Get(record, sizeof record);
+            world(WorldImpl(record));
+        });
+    }
+
+  private:
+    BrixSim::Store::ReadHold hold_;
+};
+
 }  // namespace
 
 namespace KernCtl::Resource {
@@ -75,28 +97,9 @@ namespace KernCtl::Resource {
 ResourceInfoImpl::ResourceInfoImpl() = default;
 ResourceInfoImpl::~ResourceInfoImpl() = default;
 
-std::vector<std::unique_ptr<HostCtl::Resource::World>> ResourceInfoImpl::GetAllWorlds() {
-    BrixSim::Store& store = BrixSim::Store::Get();
-    store.Check(kGetAllWorlds);
-    // One read transaction for the listing and every record: one state of the host, and the
-    // records come from the listing's pass over the table.
-    std::vector<std::unique_ptr<HostCtl::Resource::World>> worlds;
-    store.Read([&] {
-        Util::Sysinfo list(KSI_NODE_system_worlds);
-        std::vector<std::string> ids;
-        list.List(ids);
-
-        Util::Sysinfo info(KSI_NODE_system_worlds_info);
-        worlds.reserve(ids.size());
-        unsigned char record[R::kSize];
-        for (const auto& id : ids) {
-            info.ResetInstance();
-            info.AddInstancePath(id);
-            info.Get(record, sizeof record);
-            worlds.push_back(std::make_unique<WorldImpl>(record));
-        }
-    });
-    return worlds;
+std::shared_ptr<HostCtl::Resource::WorldList> ResourceInfoImpl::GetAllWorlds() {
+    BrixSim::Store::Get().Check(kGetAllWorlds);
+    return std::make_shared<WorldListImpl>();
 }
 
 }  // namespace KernCtl::Resource

@@ -1,6 +1,7 @@
 // The kernel's user-level worlds: the table they live in, a realistic seeded host, and the two
 // system-information nodes through which the kernel publishes them.
 #include <charconv>
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
@@ -237,39 +238,40 @@ WorldRow ReadRow(const BrixSim::Stmt& row) {
             row.Text(11)};
 }
 
-// Inside one read transaction the listing reads every record in the same pass, and the records
-// asked for next, in the listing's order, come from it: a listing of many worlds then costs one
-// query, not one a world. Each record is handed out once and its memory freed.
-struct ListedWorlds {
+// Inside one read transaction the listing reads every record in the same pass, and the record
+// asked for while its name is being handed out comes from it: a listing of many worlds then
+// costs one query, not one a world, and holds one record at a time.
+struct ListedWorld {
     uint64_t snapshot = 0;
-    std::vector<WorldRow> rows;
-    size_t next = 0;
+    std::optional<WorldRow> row;
 };
-ListedWorlds& Listed() {
-    static ListedWorlds listed;
+ListedWorld& Listed() {
+    static ListedWorld listed;
     return listed;
 }
 
-std::vector<std::string> ListWorlds(const std::vector<std::string>& instancePath) {
-    std::vector<std::string> names;
-    if (!instancePath.empty()) return names;
+void EachWorld(const std::vector<std::string>& instancePath,
+               const std::function<void(const std::string&)>& name) {
+    if (!instancePath.empty()) return;
     Store& store = Store::Get();
-    ListedWorlds& listed = Listed();
-    listed.rows.clear();
-    listed.next = 0;
-    listed.snapshot = store.ReadSnapshot();
-    if (listed.snapshot == 0) {
+    ListedWorld& listed = Listed();
+    const uint64_t snapshot = store.ReadSnapshot();
+    if (snapshot == 0) {
         auto rows = store.Prepare("SELECT id FROM process_worlds ORDER BY id");
-        while (rows.Step()) names.push_back(std::to_string(rows.Int(0)));
-        return names;
+        while (rows.Step()) name(std::to_string(rows.Int(0)));
+        return;
     }
+    struct Forget {
+        ListedWorld& listed;
+        ~Forget() { listed.row.reset(); }
+    } forget{listed};
     auto rows =
         store.Prepare(std::string("SELECT ") + kWorldColumns + " FROM process_worlds ORDER BY id");
     while (rows.Step()) {
-        names.push_back(std::to_string(rows.Int(0)));
-        listed.rows.push_back(ReadRow(rows));
+        listed.snapshot = snapshot;
+        listed.row = ReadRow(rows);
+        name(std::to_string(listed.row->id));
     }
-    return names;
 }
 
 void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t size) {
@@ -279,12 +281,11 @@ void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t
         throw HostCtl::Lib::HostCtlException("Sysinfo node system.worlds.info: no world selected");
     }
     const std::string& name = instancePath[0];
-    ListedWorlds& listed = Listed();
+    ListedWorld& listed = Listed();
     std::optional<WorldRow> world;
-    if (listed.snapshot != 0 && listed.snapshot == Store::Get().ReadSnapshot() &&
-        listed.next < listed.rows.size() && std::to_string(listed.rows[listed.next].id) == name) {
-        world = std::move(listed.rows[listed.next++]);
-        if (listed.next == listed.rows.size()) listed.rows = {};
+    if (listed.row && listed.snapshot == Store::Get().ReadSnapshot() &&
+        std::to_string(listed.row->id) == name) {
+        world = listed.row;
     }
     if (!world) {
         int64_t id = 0;
@@ -319,11 +320,11 @@ const bool registered = [] {
         {[](const std::vector<std::string>&, void*, size_t) {
              throw HostCtl::Lib::HostCtlException("Sysinfo node system.worlds has no record");
          },
-         ListWorlds});
+         EachWorld});
     BrixSim::RegisterScaleKey("worlds", {"user-level worlds", GrowWorlds});
-    BrixSim::RegisterSysinfoNode(
-        KSI_NODE_system_worlds_info,
-        {GetWorld, [](const std::vector<std::string>&) { return std::vector<std::string>(); }});
+    BrixSim::RegisterSysinfoNode(KSI_NODE_system_worlds_info,
+                                 {GetWorld, [](const std::vector<std::string>&,
+                                               const std::function<void(const std::string&)>&) {}});
     return BrixSim::RegisterTables({
         "process",
         "CREATE TABLE IF NOT EXISTS process_worlds ("

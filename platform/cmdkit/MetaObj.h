@@ -2,8 +2,10 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -110,11 +112,30 @@ class MetaStruct : public MetaObject {
     std::vector<Field> fields_;
 };
 
+// The rows of a listing read while it is printed, so that a listing of any length is printed in
+// the memory of one row. A formatter walks them once, or twice (a table measures its columns
+// first); every walk yields the same rows.
+class RowSource {
+  public:
+    virtual ~RowSource() = default;
+    virtual void Each(const std::function<void(std::shared_ptr<MetaStruct>)>& row) = 0;
+};
+
+// Thrown by a row source that cannot read its rows; the text is the command's error message.
+class RowError : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
 class MetaList : public MetaObject {
   public:
     // elementType: META_STRING or META_STRUCT (with a prototype describing the rows).
     static std::shared_ptr<MetaList> New(int elementType);
     static std::shared_ptr<MetaList> New(int elementType, std::shared_ptr<MetaStruct> prototype);
+    // A list of structures shaped like `prototype` (which names every field), read from `rows`
+    // when it is walked.
+    static std::shared_ptr<MetaList> New(std::shared_ptr<MetaStruct> prototype,
+                                         std::shared_ptr<RowSource> rows);
     MetaObjectType GetMetaType() const override { return META_LIST; }
 
     void Add(const std::string& text);
@@ -124,8 +145,12 @@ class MetaList : public MetaObject {
 
     int GetElementType() const { return elementType_; }
     const std::shared_ptr<MetaStruct>& GetPrototype() const { return prototype_; }
-    const std::vector<std::shared_ptr<MetaObject>>& GetElements() const { return elements_; }
-    size_t Size() const { return elements_.size(); }
+    // Every element, one at a time: a list read from a row source holds none of them.
+    void ForEach(const std::function<void(const MetaObject&)>& element) const;
+    bool IsStreamed() const { return rows_ != nullptr; }
+    // Every element at once; a list read from a row source reads them all, once.
+    const std::vector<std::shared_ptr<MetaObject>>& GetElements() const;
+    size_t Size() const { return GetElements().size(); }
 
   private:
     MetaList(int elementType, std::shared_ptr<MetaStruct> prototype)
@@ -133,7 +158,8 @@ class MetaList : public MetaObject {
 
     int elementType_;
     std::shared_ptr<MetaStruct> prototype_;
-    std::vector<std::shared_ptr<MetaObject>> elements_;
+    mutable std::vector<std::shared_ptr<MetaObject>> elements_;
+    mutable std::shared_ptr<RowSource> rows_;
 };
 
 }  // namespace CmdKit::MetaObj

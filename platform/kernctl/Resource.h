@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -35,6 +36,18 @@ class World {
     World() = default;
 };
 
+// The worlds of one moment, read as they are walked rather than all at once.
+class WorldList {
+  public:
+    virtual ~WorldList() = default;
+    // Calls `world` for each world, ordered by world id; every walk sees the same worlds. The
+    // world passed is valid only during the call.
+    virtual void Each(const std::function<void(const World& world)>& world) = 0;
+
+  protected:
+    WorldList() = default;
+};
+
 }  // namespace HostCtl::Resource
 
 namespace KernCtl::Resource {
@@ -44,8 +57,8 @@ class ResourceInfoImpl {
     ResourceInfoImpl();
     ~ResourceInfoImpl();
 
-    // Every user-level world, ordered by world id.
-    std::vector<std::unique_ptr<HostCtl::Resource::World>> GetAllWorlds();
+    // Every user-level world, read while the list lives.
+    std::shared_ptr<HostCtl::Resource::WorldList> GetAllWorlds();
 };
 
 }  // namespace KernCtl::Resource

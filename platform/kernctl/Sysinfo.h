@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -28,6 +29,8 @@ class Sysinfo {
     void Get(void* buffer, size_t size);
     // The instance names below the selected instance path.
     void List(std::vector<std::string>& names);
+    // As List, one name at a time, for a node with more instances than are worth holding.
+    void Each(const std::function<void(const std::string& name)>& name);
     void ResetInstance();
     void AddInstancePath(const std::string& name);
 

@@ -1,5 +1,7 @@
 #include "frame/CommandKit.h"
 
+#include "hostctl/ReadScope.h"
+
 namespace OstrelCli::System {
 
 Params& Params::Add(const std::string& name, int type, const std::string& shortName,
@@ -59,6 +61,38 @@ std::shared_ptr<CallSpec::OutputSpec> Returns(std::shared_ptr<MetaObj::MetaObjec
 
 std::shared_ptr<MetaObj::MetaList> StructList(std::shared_ptr<MetaObj::MetaStruct> prototype) {
     return MetaObj::MetaList::New(MetaObj::META_STRUCT, std::move(prototype));
+}
+
+namespace {
+
+// The rows are read in the read scope taken when the command made the list, so every walk over
+// them sees the same host.
+class CallbackRows final : public MetaObj::RowSource {
+  public:
+    CallbackRows(std::function<void(const RowCallback&)> each, std::string prefix)
+        : each_(std::move(each)), prefix_(std::move(prefix)) {}
+
+    void Each(const RowCallback& row) override {
+        try {
+            each_(row);
+        } catch (const HostCtl::Lib::HostCtlException& error) {
+            throw MetaObj::RowError(prefix_ + error.what());
+        }
+    }
+
+  private:
+    HostCtl::Lib::ReadScope scope_;
+    std::function<void(const RowCallback&)> each_;
+    std::string prefix_;
+};
+
+}  // namespace
+
+std::shared_ptr<MetaObj::MetaList> StreamedList(std::shared_ptr<MetaObj::MetaStruct> prototype,
+                                                std::function<void(const RowCallback& row)> each,
+                                                const std::string& prefix) {
+    return MetaObj::MetaList::New(std::move(prototype),
+                                  std::make_shared<CallbackRows>(std::move(each), prefix));
 }
 
 void Answer(CallSpec::Output& output, std::shared_ptr<MetaObj::MetaObject> result) {

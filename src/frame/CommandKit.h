@@ -2,6 +2,7 @@
 // convention, and answering.
 #pragma once
 
+#include <functional>
 #include <initializer_list>
 #include <memory>
 #include <string>
@@ -49,6 +50,15 @@ std::shared_ptr<CallSpec::ParameterConstraint> Regex(const std::string& pattern)
 std::shared_ptr<CallSpec::OutputSpec> Returns(std::shared_ptr<MetaObj::MetaObject> prototype);
 // A list of structures shaped like `prototype`.
 std::shared_ptr<MetaObj::MetaList> StructList(std::shared_ptr<MetaObj::MetaStruct> prototype);
+
+// A list of structures shaped like `prototype`, whose rows `each` hands to `row` while the list is
+// printed, one at a time, so that a listing of any length takes the memory of one row. `each` may
+// be called more than once and gives the same rows each time. A HostCtlException it throws becomes
+// the command's error message `prefix + what()`, as with Guard.
+using RowCallback = std::function<void(std::shared_ptr<MetaObj::MetaStruct>)>;
+std::shared_ptr<MetaObj::MetaList> StreamedList(std::shared_ptr<MetaObj::MetaStruct> prototype,
+                                                std::function<void(const RowCallback& row)> each,
+                                                const std::string& prefix = std::string());
 
 // Sets `result` as the root object and marks the output complete.
 void Answer(CallSpec::Output& output, std::shared_ptr<MetaObj::MetaObject> result);

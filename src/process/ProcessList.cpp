@@ -52,39 +52,43 @@ std::shared_ptr<CallSpec::OutputSpec> ProcessList::GetOutputSpecInternal() {
 void ProcessList::ExecuteInternal(InputPtr, OutputPtr output) {
     Guard(*output, [&] {
         KernCtl::Resource::ResourceInfoImpl resources;
-        auto list = StructList(GetOutputStructure());
         auto worlds = resources.GetAllWorlds();
-        KernCtl::Security::KernAccessInterfaceImpl access;
         // A host has a handful of security domains and may have many thousands of worlds: each
         // domain's label is asked for once.
-        std::unordered_map<uint32_t, std::string> labels;
-        auto label = [&](uint32_t domain) -> const std::string& {
-            auto found = labels.find(domain);
-            if (found == labels.end()) {
-                found = labels.emplace(domain, access.GetLabel(domain, 0)).first;
-            }
-            return found->second;
+        auto labels = std::make_shared<std::unordered_map<uint32_t, std::string>>();
+        auto each = [worlds, labels](const RowCallback& emit) {
+            KernCtl::Security::KernAccessInterfaceImpl access;
+            auto label = [&](uint32_t domain) -> const std::string& {
+                auto found = labels->find(domain);
+                if (found == labels->end()) {
+                    found = labels->emplace(domain, access.GetLabel(domain, 0)).first;
+                }
+                return found->second;
+            };
+            worlds->Each([&](const HostCtl::Resource::World& world) {
+                emit(Row(world, label(world.GetSecurityDomain())));
+            });
         };
-        list->Reserve(worlds.size());
-        for (auto& world : worlds) {
-            auto row = MetaObj::MetaStruct::New("UserWorld");
-            row->SetField("Id", static_cast<long>(world->GetId()), kDoc);
-            row->SetField("Name", world->GetName(), kDoc);
-            row->SetField("Command Line", world->GetCommandLine(), kDoc);
-            row->SetField("Cartel Id", static_cast<long>(world->GetCartelId()), kDoc);
-            row->SetField("Parent Cartel Id", static_cast<long>(world->GetParentCartelId()), kDoc);
-            row->SetField("World Group Id", static_cast<long>(world->GetWorldGroupId()), kDoc);
-            row->SetField("Cartel Group Id", static_cast<long>(world->GetCartelGroupId()), kDoc);
-            row->SetField("Session Id", static_cast<long>(world->GetSessionId()), kDoc);
-            row->SetField("World Flags", static_cast<long>(world->GetFlags()), kDoc);
-            row->SetField("World State", world->GetStateName(), kDoc);
-            row->SetField("World Type", world->GetTypeName(), kDoc);
-            row->SetField("Security Domain", label(world->GetSecurityDomain()), kDoc);
-            list->Add(row);
-            world.reset();  // its memory serves the next rows
-        }
-        Answer(*output, list);
+        Answer(*output, StreamedList(GetOutputStructure(), each));
     });
+}
+
+std::shared_ptr<MetaObj::MetaStruct> ProcessList::Row(const HostCtl::Resource::World& world,
+                                                      const std::string& domainLabel) {
+    auto row = MetaObj::MetaStruct::New("UserWorld");
+    row->SetField("Id", static_cast<long>(world.GetId()), kDoc);
+    row->SetField("Name", world.GetName(), kDoc);
+    row->SetField("Command Line", world.GetCommandLine(), kDoc);
+    row->SetField("Cartel Id", static_cast<long>(world.GetCartelId()), kDoc);
+    row->SetField("Parent Cartel Id", static_cast<long>(world.GetParentCartelId()), kDoc);
+    row->SetField("World Group Id", static_cast<long>(world.GetWorldGroupId()), kDoc);
+    row->SetField("Cartel Group Id", static_cast<long>(world.GetCartelGroupId()), kDoc);
+    row->SetField("Session Id", static_cast<long>(world.GetSessionId()), kDoc);
+    row->SetField("World Flags", static_cast<long>(world.GetFlags()), kDoc);
+    row->SetField("World State", world.GetStateName(), kDoc);
+    row->SetField("World Type", world.GetTypeName(), kDoc);
+    row->SetField("Security Domain", domainLabel, kDoc);
+    return row;
 }
 
 }  // namespace OstrelCli::System

@@ -2,6 +2,10 @@
 
 #include "frame/CommandKit.h"
 
+namespace HostCtl::Resource {
+class World;
+}
+
 namespace OstrelCli::System {
 
 class ProcessList : public virtual CmdKit::AutoCli::Command {
@@ -17,6 +21,8 @@ class ProcessList : public virtual CmdKit::AutoCli::Command {
 
   private:
     ProcessList();
+    static std::shared_ptr<MetaObj::MetaStruct> Row(const HostCtl::Resource::World& world,
+                                                    const std::string& domainLabel);
 };
 
 }  // namespace OstrelCli::System

@@ -81,24 +81,20 @@ std::shared_ptr<MetaObj::MetaStruct> FormatOption(HostCtl::Adv::AdvancedOption& 
     return row;
 }
 
-void FormatBranch(HostCtl::Adv::AdvancedOptionBranch& branch, MetaObj::MetaList& list, bool delta) {
+void FormatBranch(HostCtl::Adv::AdvancedOptionBranch& branch, const RowCallback& row, bool delta) {
     for (const auto& option : branch.GetOptions()) {
-        std::shared_ptr<MetaObj::MetaStruct> row;
+        std::shared_ptr<MetaObj::MetaStruct> formatted;
         bool include = true;
         try {
-            row = FormatOption(*option, delta, include);
+            formatted = FormatOption(*option, delta, include);
         } catch (const HostCtl::Lib::HostCtlException&) {
             continue;  // an option that cannot be read is left out
         }
-        if (!include) continue;
-        try {
-            list.Add(row);
-        } catch (const HostCtl::Lib::HostCtlException&) {
-        }
+        if (include) row(std::move(formatted));
     }
     for (const auto& child : branch.GetBranches()) {
         try {
-            FormatBranch(*child, list, delta);
+            FormatBranch(*child, row, delta);
         } catch (const HostCtl::Lib::HostCtlException&) {
             // rows of the failing branch already added stay; the walk goes on
         }

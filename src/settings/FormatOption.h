@@ -14,8 +14,8 @@ namespace OstrelCli::System {
 std::shared_ptr<MetaObj::MetaStruct> FormatOption(HostCtl::Adv::AdvancedOption& option, bool delta,
                                                   bool& include);
 
-// Appends the rows of the subtree at `branch` to `list`, pre-order: a branch's own options
-// before its sub-branches. An option or sub-branch that fails to read is skipped.
-void FormatBranch(HostCtl::Adv::AdvancedOptionBranch& branch, MetaObj::MetaList& list, bool delta);
+// Hands the rows of the subtree at `branch` to `row`, pre-order: a branch's own options before
+// its sub-branches. An option or sub-branch that fails to read is skipped.
+void FormatBranch(HostCtl::Adv::AdvancedOptionBranch& branch, const RowCallback& row, bool delta);
 
 }  // namespace OstrelCli::System

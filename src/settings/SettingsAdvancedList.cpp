@@ -67,8 +67,8 @@ void SettingsAdvancedList::ExecuteInternal(InputPtr input, OutputPtr output) {
             return;
         }
 
-        std::unique_ptr<HostCtl::Adv::AdvancedOptionBranch> branch =
-            std::make_unique<KernCtl::Adv::AdvancedOptionBranchImpl>();
+        std::shared_ptr<HostCtl::Adv::AdvancedOptionBranch> branch =
+            std::make_shared<KernCtl::Adv::AdvancedOptionBranchImpl>();
         const bool hasTree = input->HasParameter("tree");
         const std::string tree = hasTree ? input->GetParameter("tree") : std::string();
         const bool delta = input->IsFlagSet("delta");
@@ -79,7 +79,11 @@ void SettingsAdvancedList::ExecuteInternal(InputPtr input, OutputPtr output) {
             }
         }
         if (branch) {
-            FormatBranch(*branch, *list, delta);
+            Answer(*output,
+                   StreamedList(GetOutputStructure(), [branch, delta](const RowCallback& row) {
+                       FormatBranch(*branch, row, delta);
+                   }));
+            return;
         } else {
             // The caller still receives the (empty) list.
             output->AddErrorMessage("Invalid value for --tree No tree with the name " +

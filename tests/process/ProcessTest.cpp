@@ -202,11 +202,15 @@ TEST(ProcessList, WorldRecordCarriesEveryFieldAtItsOffset) {
     EXPECT_EQ(record[609], 0);
 
     // Read back through the resource library.
-    const auto worlds = KernCtl::Resource::ResourceInfoImpl().GetAllWorlds();
-    ASSERT_EQ(worlds.size(), 1u);
-    EXPECT_EQ(worlds[0]->GetSecurityDomain(), 0x0A0B0C0Du);
-    EXPECT_EQ(worlds[0]->GetStateName(), "Sleeping");
-    EXPECT_EQ(worlds[0]->GetTypeName(), "Helper");
+    int seen = 0;
+    KernCtl::Resource::ResourceInfoImpl().GetAllWorlds()->Each(
+        [&](const HostCtl::Resource::World& world) {
+            ++seen;
+            EXPECT_EQ(world.GetSecurityDomain(), 0x0A0B0C0Du);
+            EXPECT_EQ(world.GetStateName(), "Sleeping");
+            EXPECT_EQ(world.GetTypeName(), "Helper");
+        });
+    EXPECT_EQ(seen, 1);
 
     info.ResetInstance();
     info.AddInstancePath("99");

@@ -295,13 +295,17 @@ void PrintTo(const WalkCase& row, std::ostream* out) {
     *out << row.name;
 }
 
+OstrelCli::System::RowCallback AddTo(MetaObj::MetaList& list) {
+    return [&list](std::shared_ptr<MetaObj::MetaStruct> row) { list.Add(std::move(row)); };
+}
+
 class FormatBranchWalk : public testing::TestWithParam<WalkCase> {};
 
 TEST_P(FormatBranchWalk, VisitsPreOrder) {
     const auto& c = GetParam();
     Branch root(c.tree);
     auto list = EmptyList();
-    FormatBranch(root, *list, c.delta);
+    FormatBranch(root, AddTo(*list), c.delta);
     EXPECT_EQ(Paths(*list), c.paths);
 }
 
@@ -335,10 +339,10 @@ INSTANTIATE_TEST_SUITE_P(Trees, FormatBranchWalk, testing::ValuesIn(kWalks),
 TEST(FormatBranch, RootFailureAndOtherExceptionsPassOut) {
     auto list = EmptyList();
     Branch failing(Spec{"", {}, {}, true});
-    EXPECT_THROW(FormatBranch(failing, *list, false), HostCtlException);
+    EXPECT_THROW(FormatBranch(failing, AddTo(*list), false), HostCtlException);
 
     Branch other(Spec{"", {"a"}, {Spec{"X", {}, {}, false, false, true}}});
-    EXPECT_THROW(FormatBranch(other, *list, false), std::runtime_error);
+    EXPECT_THROW(FormatBranch(other, AddTo(*list), false), std::runtime_error);
     EXPECT_EQ(Paths(*list), std::vector<std::string>{"a"});
 }
 
