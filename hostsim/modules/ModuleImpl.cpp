@@ -328,14 +328,31 @@ void ModuleImpl::CopyParameters(const std::string& source, const std::vector<std
     });
 }
 
-std::vector<std::unique_ptr<HostCtl::System::Module>> SystemInfoImpl::GetModules() {
-    auto& store = Store::Get();
-    store.Check(kGetModules);
-    auto row = store.Prepare(std::string("SELECT ") + Modules::kRecordColumns +
-                             " FROM modules ORDER BY seq");
-    std::vector<std::unique_ptr<HostCtl::System::Module>> modules;
-    while (row.Step()) modules.push_back(std::make_unique<ModuleImpl>(Modules::ReadRecord(row)));
-    return modules;
+namespace {
+
+// One module record at a time, all in the read transaction the list holds.
+class ModuleListImpl final : public HostCtl::System::ModuleList {
+  public:
+    ModuleListImpl() : hold_(Store::Get()) {}
+
+    void Each(const std::function<void(HostCtl::System::Module&)>& module) override {
+        auto row = Store::Get().Prepare(std::string("SELECT ") + Modules::kRecordColumns +
+                                        " FROM modules ORDER BY seq");
+        while (row.Step()) {
+            ModuleImpl current(Modules::ReadRecord(row));
+            module(current);
+        }
+    }
+
+  private:
+    Store::ReadHold hold_;
+};
+
+}  // namespace
+
+std::shared_ptr<HostCtl::System::ModuleList> SystemInfoImpl::GetModules() {
+    Store::Get().Check(kGetModules);
+    return std::make_shared<ModuleListImpl>();
 }
 
 std::unique_ptr<HostCtl::System::Module> SystemInfoImpl::GetModuleByName(const std::string& name) {

@@ -73,4 +73,16 @@ class Module {
     Module() = default;
 };
 
+// The modules of one moment, read as they are walked rather than all at once.
+class ModuleList {
+  public:
+    virtual ~ModuleList() = default;
+    // Calls `module` for each module, in the kernel's order; every walk sees the same modules.
+    // The module passed is valid only during the call.
+    virtual void Each(const std::function<void(Module& module)>& module) = 0;
+
+  protected:
+    ModuleList() = default;
+};
+
 }  // namespace HostCtl::System

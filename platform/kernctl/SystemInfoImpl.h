@@ -9,6 +9,7 @@
 
 namespace HostCtl::System {
 class Module;
+class ModuleList;
 class LogLevel;
 }  // namespace HostCtl::System
 
@@ -37,8 +38,8 @@ class SystemInfoImpl {
     void SetCbrcEnabled(bool enabled);
 
     // --- modules and log levels ---
-    // Every module the kernel knows, in the kernel's order.
-    std::vector<std::unique_ptr<HostCtl::System::Module>> GetModules();
+    // Every module the kernel knows, in the kernel's order, read while the list lives.
+    std::shared_ptr<HostCtl::System::ModuleList> GetModules();
     // The module of exactly that name, or null.
     std::unique_ptr<HostCtl::System::Module> GetModuleByName(const std::string& name);
     // The kernel core's log levels; changes last until the host restarts.

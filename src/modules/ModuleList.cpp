@@ -45,21 +45,22 @@ void ModuleList::ExecuteInternal(InputPtr input, OutputPtr output) {
         const bool filterEnabled = input->HasParameter("enabled");
         const bool wantEnabled = filterEnabled && input->GetParameterBool("enabled");
 
-        const auto& doc = MetaObj::MetaStruct::_docEmpty;
-        auto list = StructList(GetOutputStructure());
-        KernCtl::System::SystemInfoImpl systemInfo;
-        for (const auto& module : systemInfo.GetModules()) {
-            const bool loaded = module->IsLoaded();
-            const bool enabled = module->IsEnabled();
-            if (filterLoaded && loaded != wantLoaded) continue;
-            if (filterEnabled && enabled != wantEnabled) continue;
-            auto row = MetaObj::MetaStruct::New("Module");
-            row->SetField("Name", module->GetName(), doc);
-            row->SetField("Is Loaded", loaded, doc);
-            row->SetField("Is Enabled", enabled, doc);
-            list->Add(row);
-        }
-        Answer(*output, list);
+        auto modules = KernCtl::System::SystemInfoImpl().GetModules();
+        auto each = [=](const RowCallback& emit) {
+            const auto& doc = MetaObj::MetaStruct::_docEmpty;
+            modules->Each([&](HostCtl::System::Module& module) {
+                const bool loaded = module.IsLoaded();
+                const bool enabled = module.IsEnabled();
+                if (filterLoaded && loaded != wantLoaded) return;
+                if (filterEnabled && enabled != wantEnabled) return;
+                auto row = MetaObj::MetaStruct::New("Module");
+                row->SetField("Name", module.GetName(), doc);
+                row->SetField("Is Loaded", loaded, doc);
+                row->SetField("Is Enabled", enabled, doc);
+                emit(row);
+            });
+        };
+        Answer(*output, StreamedList(GetOutputStructure(), each));
     });
 }
 

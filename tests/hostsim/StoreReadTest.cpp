@@ -155,4 +155,26 @@ TEST(StoreRead, EachCommandExecutesInItsOwnReadTransaction) {
     EXPECT_NE(command->seen, first);
 }
 
+// A listing printed after its command returned reads the state its command began in: a hold
+// taken inside a read keeps that read open, and another process's write stays out of it.
+TEST(StoreRead, AHoldKeepsTheReadItWasTakenInOpen) {
+    TempHost host;
+    auto& store = Store::Get();
+    store.SetValue("hold.key", "before");
+    std::unique_ptr<Store::ReadHold> hold;
+    uint64_t snapshot = 0;
+    store.Read([&] {
+        hold = std::make_unique<Store::ReadHold>(store);
+        snapshot = store.ReadSnapshot();
+        EXPECT_EQ(store.GetValue("hold.key", ""), "before");
+    });
+    EXPECT_EQ(store.ReadSnapshot(), snapshot);
+    WriteElsewhere(host, "UPDATE host SET value = 'after' WHERE key = 'hold.key'");
+    EXPECT_EQ(store.GetValue("hold.key", ""), "before");
+    store.Read([&] { EXPECT_EQ(store.ReadSnapshot(), snapshot); });  // nested: the same one
+    hold.reset();
+    EXPECT_EQ(store.ReadSnapshot(), 0u);
+    EXPECT_EQ(store.GetValue("hold.key", ""), "after");
+}
+
 }  // namespace

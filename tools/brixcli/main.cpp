@@ -9,7 +9,6 @@
 #include <system_error>
 #include <vector>
 
-#include "LargePageHeap.h"
 #include "ToolOutput.h"
 #include "cmdkit/Cli.h"
 
@@ -79,7 +78,6 @@ std::vector<std::string> LoadPlugins(const std::shared_ptr<CmdKit::AutoCli::Name
 
 int main(int argc, char** argv) {
     BrixTools::HoldClosedStandardDescriptors();
-    BrixCli::ReserveLargePageHeap();
     const auto& output = BrixTools::CaptureStandardOutput();
     auto root = CmdKit::AutoCli::Namespace::New();
     CmdKit::AutoCli::Program program{"brixcli", BRIX_VERSION, LoadPlugins(root)};
