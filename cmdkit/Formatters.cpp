@@ -7,6 +7,7 @@
 #include <ostream>
 #include <pugixml.hpp>
 #include <sstream>
+#include <utility>
 
 #include "Internal.h"
 
@@ -86,7 +87,7 @@ std::vector<const MetaStruct::Field*> AllFields(const MetaStruct& object,
 }
 
 const MetaObject* DeclaredField(const MetaStruct* prototype, const std::string& name) {
-    return prototype ? prototype->GetField(name).get() : nullptr;
+    return prototype ? prototype->FindField(name) : nullptr;
 }
 
 // The names of the fields to show of a structure: the "fields:<Struct>" hint when set,
@@ -97,7 +98,7 @@ std::vector<std::string> ShownFields(const MetaStruct& object, const MetaStruct*
     const std::string hint = Hint(hints, "fields:" + object.GetName());
     if (!hint.empty()) {
         for (const auto& name : SplitNamesOnce(hint)) {
-            if (object.GetField(name) || DeclaredField(prototype, name)) names.push_back(name);
+            if (object.FindField(name) || DeclaredField(prototype, name)) names.push_back(name);
         }
         return names;
     }
@@ -197,8 +198,8 @@ void SimpleStruct(const MetaStruct& object, const MetaStruct* prototype, const H
         fieldIndent += 3;
     }
     for (const auto& name : ShownFields(object, prototype, hints)) {
-        SimpleField(name, object.GetField(name).get(), DeclaredField(prototype, name),
-                    object.GetName(), hints, fieldIndent, out);
+        SimpleField(name, object.FindField(name), DeclaredField(prototype, name), object.GetName(),
+                    hints, fieldIndent, out);
     }
 }
 
@@ -285,7 +286,7 @@ void FormatTable(const MetaList& list, const FormatContext& context, std::ostrea
     auto cellsOf = [&](const MetaObject& element) -> const std::vector<std::string>& {
         const MetaStruct* row = AsStruct(&element);
         for (size_t i = 0; i < columns.size(); ++i) {
-            cells[i] = row ? OneLine(InlineText(row->GetField(columns[i]).get())) : "";
+            cells[i] = row ? OneLine(InlineText(row->FindField(columns[i]))) : "";
         }
         return cells;
     };
@@ -454,40 +455,45 @@ std::string CsvCell(const std::string& text) {
     return quoted + "\"";
 }
 
-// The rows are walked twice: once for the columns (the prototype's, then any other field a row
-// has), once to print.
+// The columns are the prototype's, then any other field a row has: the rows are walked for them
+// first, unless `prototypeNamesAll` (a streamed list's prototype names every field).
 void CsvRows(const std::function<void(const std::function<void(const MetaStruct&)>&)>& eachRow,
-             const MetaStruct* prototype, std::ostream& out) {
+             const MetaStruct* prototype, bool prototypeNamesAll, std::ostream& out) {
     std::vector<std::string> columns;
     if (prototype) {
         for (const auto& field : prototype->GetFields()) columns.push_back(field.name);
     }
-    eachRow([&](const MetaStruct& row) {
-        for (const auto& field : row.GetFields()) {
-            if (std::find(columns.begin(), columns.end(), field.name) == columns.end()) {
-                columns.push_back(field.name);
+    if (!prototypeNamesAll || !prototype) {
+        eachRow([&](const MetaStruct& row) {
+            for (const auto& field : row.GetFields()) {
+                if (std::find(columns.begin(), columns.end(), field.name) == columns.end()) {
+                    columns.push_back(field.name);
+                }
             }
-        }
-    });
+        });
+    }
     if (columns.empty()) return;
     auto writeLine = [&](const std::vector<std::string>& cells) {
         for (size_t i = 0; i < cells.size(); ++i) out << (i ? "," : "") << CsvCell(cells[i]);
         out << '\n';
     };
-    writeLine(columns);
+    // The header waits for the first row, so that rows failing at once leave nothing written.
+    bool headed = false;
     std::vector<std::string> cells(columns.size());
     eachRow([&](const MetaStruct& row) {
         for (size_t i = 0; i < columns.size(); ++i) {
-            cells[i] = InlineText(row.GetField(columns[i]).get());
+            cells[i] = InlineText(row.FindField(columns[i]));
         }
+        if (!std::exchange(headed, true)) writeLine(columns);
         writeLine(cells);
     });
+    if (!headed) writeLine(columns);
 }
 
 void FormatCsv(const MetaObject& result, const FormatContext& context, std::ostream& out) {
     if (const MetaStruct* object = AsStruct(&result)) {
         const MetaStruct* declared = AsStruct(context.prototype.get());
-        CsvRows([&](const auto& row) { row(*object); }, declared ? declared : object, out);
+        CsvRows([&](const auto& row) { row(*object); }, declared ? declared : object, false, out);
         return;
     }
     if (const MetaList* list = AsList(&result)) {
@@ -497,7 +503,8 @@ void FormatCsv(const MetaObject& result, const FormatContext& context, std::ostr
                     if (const MetaStruct* structure = AsStruct(&element)) row(*structure);
                 });
             };
-            CsvRows(eachRow, ElementPrototype(*list, context.prototype.get()), out);
+            CsvRows(eachRow, ElementPrototype(*list, context.prototype.get()), list->IsStreamed(),
+                    out);
             return;
         }
         list->ForEach(

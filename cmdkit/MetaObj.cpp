@@ -123,6 +123,13 @@ std::shared_ptr<MetaObject> MetaStruct::GetField(const std::string& name) const 
     return nullptr;
 }
 
+const MetaObject* MetaStruct::FindField(const std::string& name) const {
+    for (const auto& field : fields_) {
+        if (field.name == name) return field.value.get();
+    }
+    return nullptr;
+}
+
 std::shared_ptr<MetaList> MetaList::New(int elementType) {
     return New(elementType, nullptr);
 }

@@ -509,7 +509,9 @@ void Store::Open() {
     root_ = fs::canonical(root_, ec);
     if (ec) throw StoreError("host store: " + root_.string() + ": " + ec.message(), 0);
 
-    const int flags = SQLITE_OPEN_READWRITE | (marked ? 0 : SQLITE_OPEN_CREATE);
+    // One thread uses the connection: SQLite need not lock it around every call.
+    const int flags =
+        SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | (marked ? 0 : SQLITE_OPEN_CREATE);
     if (sqlite3_open_v2((root_ / "host.db").c_str(), &db_, flags, nullptr) != SQLITE_OK) {
         if (!db_) throw StoreError("host store " + file.string() + ": out of memory", SQLITE_NOMEM);
         try {
@@ -538,8 +540,9 @@ void Store::Open() {
         sqlite3_close_v2(db_);
         db_ = nullptr;
         const std::string uri = "file:" + (root_ / "host.db").string() + "?immutable=1";
-        if (sqlite3_open_v2(uri.c_str(), &db_, SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr) !=
-            SQLITE_OK) {
+        if (sqlite3_open_v2(uri.c_str(), &db_,
+                            SQLITE_OPEN_READONLY | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_URI,
+                            nullptr) != SQLITE_OK) {
             ThrowStoreError(db_);
         }
         readOnly_ = true;

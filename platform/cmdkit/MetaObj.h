@@ -103,6 +103,8 @@ class MetaStruct : public MetaObject {
     const std::vector<Field>& GetFields() const { return fields_; }
     // The field's value, or null when the structure has no such field.
     std::shared_ptr<MetaObject> GetField(const std::string& name) const;
+    // As GetField, without taking a reference: valid while the structure keeps the field.
+    const MetaObject* FindField(const std::string& name) const;
 
   private:
     explicit MetaStruct(std::string name) : name_(std::move(name)) {}
