@@ -7,36 +7,19 @@
 
 #include "cmdkit/Text.h"
 #include "core/Hooks.h"
+#include "core/KsiRecord.h"
 #include "core/Store.h"
 #include "kernctl/Sysinfo.h"
 #include "memfs/QuillfsState.h"
-#include "process/KsiRecord.h"
 
 namespace {
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;
 
-// Record layouts (packed, little-endian).
-namespace StatusRecord {
-constexpr size_t kSize = 1124;
-constexpr size_t kTotal = 4, kUsed = 8, kPeakUsed = 12, kUnlinked = 16, kPeakUnlinked = 20,
-                 kReserved = 24, kPeakReserved = 28;
-}  // namespace StatusRecord
-
-namespace RamdiskRecord {
-constexpr size_t kSize = 180;
-constexpr size_t kReservedMib = 0, kMaximumMib = 4, kUsedPages = 8, kPeakPages = 12;
-constexpr size_t kReservedInodes = 16, kPermissions = 20;
-constexpr size_t kCoredump = 24, kSystem = 25;
-constexpr size_t kMountPoint = 30, kMountPointWidth = 132;
-constexpr size_t kMaxInodes = 162, kAllocatedInodes = 166, kUsedInodes = 170;
-}  // namespace RamdiskRecord
-
-namespace TardiskRecord {
-constexpr size_t kSize = 28;
-constexpr size_t kBytes = 0, kSystem = 8;
-}  // namespace TardiskRecord
+namespace StatusRecord = KernCtl::Ksi::QuillfsStatusRecord;
+namespace RamdiskRecord = KernCtl::Ksi::RamdiskRecord;
+namespace TardiskRecord = KernCtl::Ksi::TardiskRecord;
 
 const char kSchema[] =
     "CREATE TABLE IF NOT EXISTS quillfs_ramdisks ("

@@ -3,19 +3,19 @@
 #include <string>
 #include <utility>
 
+#include "core/KsiRecord.h"
 #include "core/Operation.h"
 #include "core/Store.h"
 #include "kernctl/Resource.h"
 #include "kernctl/Sysinfo.h"
-#include "process/KsiRecord.h"
-#include "process/WorldRecord.h"
+#include "kernctl/SysinfoRecords.h"
 
 namespace {
 
 const BrixSim::Operation kGetAllWorlds{"KernCtl::Resource::ResourceInfoImpl::GetAllWorlds"};
 
-namespace R = BrixSim::WorldRecord;
-using BrixSim::Ksi::ReadU32;
+namespace R = KernCtl::Ksi::WorldRecord;
+using KernCtl::Ksi::ReadU32;
 
 // The kernel's names for its world state and type codes; a code this library does not know
 // is shown with its number.
@@ -45,8 +45,8 @@ class WorldImpl final : public HostCtl::Resource::World {
           state_(record[R::kState]),
           type_(record[R::kType]),
           domain_(ReadU32(record, R::kDomain)),
-          name_(BrixSim::Ksi::ReadText(record, R::kName, R::kNameWidth)),
-          commandLine_(BrixSim::Ksi::ReadText(record, R::kCommandLine, R::kCommandLineWidth)) {}
+          name_(KernCtl::Ksi::ReadText(record, R::kName, R::kNameWidth)),
+          commandLine_(KernCtl::Ksi::ReadText(record, R::kCommandLine, R::kCommandLineWidth)) {}
 
     uint32_t GetId() const override { return id_; }
     std::string GetName() const override { return name_; }

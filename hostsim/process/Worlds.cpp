@@ -8,10 +8,10 @@
 
 #include "cmdkit/Text.h"
 #include "core/Hooks.h"
+#include "core/KsiRecord.h"
 #include "core/Store.h"
 #include "kernctl/Sysinfo.h"
-#include "process/KsiRecord.h"
-#include "process/WorldRecord.h"
+#include "kernctl/SysinfoRecords.h"
 
 namespace {
 
@@ -275,7 +275,7 @@ void EachWorld(const std::vector<std::string>& instancePath,
 }
 
 void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t size) {
-    namespace R = BrixSim::WorldRecord;
+    namespace R = KernCtl::Ksi::WorldRecord;
     BrixSim::Ksi::RequireSize("system.worlds.info", size, R::kSize);
     if (instancePath.size() != 1) {
         throw HostCtl::Lib::HostCtlException("Sysinfo node system.worlds.info: no world selected");

@@ -7,7 +7,7 @@ namespace OstrelCli::System {
 namespace {
 
 const std::string& kDoc = MetaObj::MetaStruct::_docEmpty;
-constexpr size_t kRecordSize = 1124;
+namespace S = KernCtl::Ksi::QuillfsStatusRecord;
 
 const char* const kFields[] = {
     "Total Inodes",         "Used Inodes",        "Unlinked Inodes",
@@ -50,20 +50,22 @@ std::shared_ptr<CallSpec::OutputSpec> QuillfsGet::GetOutputSpecInternal() {
 void QuillfsGet::ExecuteInternal(InputPtr, OutputPtr output) {
     Guard(*output, [&] {
         KernCtl::Util::Sysinfo node(KSI_NODE_system_quillfs_stats);
-        unsigned char record[kRecordSize];
+        unsigned char record[S::kSize];
         node.Get(record, sizeof record);
-        const int64_t total = RecordU32(record, 4);
-        const int64_t used = RecordU32(record, 8);
-        const int64_t peakUsed = RecordU32(record, 12);
+        const int64_t total = ReadU32(record, S::kTotal);
+        const int64_t used = ReadU32(record, S::kUsed);
+        const int64_t peakUsed = ReadU32(record, S::kPeakUsed);
 
         auto status = GetOutputStructure();
         status->SetField("Total Inodes", static_cast<long>(total), kDoc);
         status->SetField("Used Inodes", static_cast<long>(used), kDoc);
         status->SetField("Peak Used Inodes", static_cast<long>(peakUsed), kDoc);
-        status->SetField("Unlinked Inodes", static_cast<long>(RecordU32(record, 16)), kDoc);
-        status->SetField("Reserved Inodes", static_cast<long>(RecordU32(record, 24)), kDoc);
-        status->SetField("Peak Unlinked Inodes", static_cast<long>(RecordU32(record, 20)), kDoc);
-        status->SetField("Peak Reserved Inodes", static_cast<long>(RecordU32(record, 28)), kDoc);
+        status->SetField("Unlinked Inodes", static_cast<long>(ReadU32(record, S::kUnlinked)), kDoc);
+        status->SetField("Reserved Inodes", static_cast<long>(ReadU32(record, S::kReserved)), kDoc);
+        status->SetField("Peak Unlinked Inodes",
+                         static_cast<long>(ReadU32(record, S::kPeakUnlinked)), kDoc);
+        status->SetField("Peak Reserved Inodes",
+                         static_cast<long>(ReadU32(record, S::kPeakReserved)), kDoc);
         // The kernel never reports a total of zero.
         status->SetField("Free Inode Percent", static_cast<long>((total - used) * 100 / total),
                          kDoc);

@@ -7,7 +7,7 @@ namespace OstrelCli::System {
 namespace {
 
 const std::string& kDoc = MetaObj::MetaStruct::_docEmpty;
-constexpr size_t kRecordSize = 180;
+namespace R = KernCtl::Ksi::RamdiskRecord;
 
 }  // namespace
 
@@ -55,31 +55,35 @@ void QuillfsRamdiskList::ExecuteInternal(InputPtr, OutputPtr output) {
     Guard(*output, [&] {
         auto list = StructList(GetOutputStructure());
         ForEachInstance(
-            KSI_NODE_system_quillfs_ramdisks, KSI_NODE_system_quillfs_ramdisks_stats, kRecordSize,
+            KSI_NODE_system_quillfs_ramdisks, KSI_NODE_system_quillfs_ramdisks_stats, R::kSize,
             [&](const std::string& name, const unsigned char* record) {
                 // Sizes in KiB: the kernel counts MiB for the limits and 4 KiB pages for use.
-                const int64_t reserved = int64_t{RecordU32(record, 0)} * 1024;
-                const int64_t maximum = int64_t{RecordU32(record, 4)} * 1024;
-                const int64_t used = int64_t{RecordU32(record, 8)} * 4;
-                const int64_t peakUsed = int64_t{RecordU32(record, 12)} * 4;
+                const int64_t reserved = int64_t{ReadU32(record, R::kReservedMib)} * 1024;
+                const int64_t maximum = int64_t{ReadU32(record, R::kMaximumMib)} * 1024;
+                const int64_t used = int64_t{ReadU32(record, R::kUsedPages)} * 4;
+                const int64_t peakUsed = int64_t{ReadU32(record, R::kPeakPages)} * 4;
                 const int64_t free = maximum == 0 ? 0 : (maximum - used) * 100 / maximum;
                 const int64_t reservedFree =
                     used >= reserved ? 0 : (reserved - used) * 100 / reserved;
 
                 auto row = GetOutputStructure();
                 row->SetField("Ramdisk Name", name, kDoc);
-                row->SetField("System", record[25] != 0, kDoc);
-                row->SetField("Include in Coredumps", record[24] != 0, kDoc);
+                row->SetField("System", record[R::kSystem] != 0, kDoc);
+                row->SetField("Include in Coredumps", record[R::kCoredump] != 0, kDoc);
                 row->SetField("Reserved", static_cast<long>(reserved), kDoc);
                 row->SetField("Maximum", static_cast<long>(maximum), kDoc);
                 row->SetField("Used", static_cast<long>(used), kDoc);
                 row->SetField("Peak Used", static_cast<long>(peakUsed), kDoc);
                 row->SetField("Free", static_cast<long>(free), kDoc);
                 row->SetField("Reserved Free", static_cast<long>(reservedFree), kDoc);
-                row->SetField("Maximum Inodes", static_cast<long>(RecordU32(record, 162)), kDoc);
-                row->SetField("Allocated Inodes", static_cast<long>(RecordU32(record, 166)), kDoc);
-                row->SetField("Used Inodes", static_cast<long>(RecordU32(record, 170)), kDoc);
-                row->SetField("Mount Point", RecordText(record, 30, 132), kDoc);
+                row->SetField("Maximum Inodes", static_cast<long>(ReadU32(record, R::kMaxInodes)),
+                              kDoc);
+                row->SetField("Allocated Inodes",
+                              static_cast<long>(ReadU32(record, R::kAllocatedInodes)), kDoc);
+                row->SetField("Used Inodes", static_cast<long>(ReadU32(record, R::kUsedInodes)),
+                              kDoc);
+                row->SetField("Mount Point", ReadText(record, R::kMountPoint, R::kMountPointWidth),
+                              kDoc);
                 list->Add(row);
             });
         Answer(*output, list);

@@ -7,7 +7,7 @@ namespace OstrelCli::System {
 namespace {
 
 const std::string& kDoc = MetaObj::MetaStruct::_docEmpty;
-constexpr size_t kRecordSize = 28;
+namespace T = KernCtl::Ksi::TardiskRecord;
 
 }  // namespace
 
@@ -43,11 +43,12 @@ void QuillfsTardiskList::ExecuteInternal(InputPtr, OutputPtr output) {
     Guard(*output, [&] {
         auto list = StructList(GetOutputStructure());
         ForEachInstance(KSI_NODE_system_quillfs_tardisks, KSI_NODE_system_quillfs_tardisks_stats,
-                        kRecordSize, [&](const std::string& name, const unsigned char* record) {
+                        T::kSize, [&](const std::string& name, const unsigned char* record) {
                             auto row = GetOutputStructure();
                             row->SetField("Tardisk Name", name, kDoc);
-                            row->SetField("System", record[8] != 0, kDoc);
-                            row->SetField("Size", static_cast<long>(RecordU32(record, 0)), kDoc);
+                            row->SetField("System", record[T::kSystem] != 0, kDoc);
+                            row->SetField("Size", static_cast<long>(ReadU32(record, T::kBytes)),
+                                          kDoc);
                             list->Add(row);
                         });
         Answer(*output, list);

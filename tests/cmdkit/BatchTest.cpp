@@ -8,6 +8,7 @@
 
 #include "FakeCommand.h"
 #include "brixcli/SystemPlugin.h"
+#include "support/BuildTree.h"
 #include "support/TestHost.h"
 
 namespace CmdKitTest {
@@ -217,9 +218,10 @@ TEST(Version, BothToolsAnswer) {
     EXPECT_EQ(cli.out, "brixcli " BRIX_VERSION "\n");
     auto verbose = host.Cli({"--version", "--verbose"});
     EXPECT_EQ(verbose.status, 0);
-    EXPECT_EQ(verbose.out, "brixcli " BRIX_VERSION "\nPlug-ins:\n  " +
-                               fs::canonical(BRIX_BIN_DIR "/../lib/brixcli/plugins").string() +
-                               "/libbrixcli-system.so\n");
+    EXPECT_EQ(verbose.out,
+              "brixcli " BRIX_VERSION "\nPlug-ins:\n  " +
+                  fs::canonical(BrixTest::BuildDir() / "lib/brixcli/plugins").string() +
+                  "/libbrixcli-system.so\n");
     auto sim = host.Sim({"--version"});
     EXPECT_EQ(sim.status, 0);
     EXPECT_EQ(sim.out, "brixsim " BRIX_VERSION "\n");

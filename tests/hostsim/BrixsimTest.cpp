@@ -7,6 +7,7 @@
 #include <sstream>
 
 #include "core/Store.h"
+#include "support/BuildTree.h"
 #include "support/TestHost.h"
 
 namespace {
@@ -246,7 +247,7 @@ TEST(Brixsim, BadImportsChangeNothing) {
 TEST(Brixsim, ImportReadsStandardInput) {
     TempHost host;
     const auto result =
-        BrixTest::Run({BRIX_BIN_DIR "/brixsim", "import", "-"},
+        BrixTest::Run({(BrixTest::BinDir() / "brixsim").string(), "import", "-"},
                       R"({"version":1,"tables":{"host":[{"key":"from","value":"stdin"}]}})");
     ASSERT_EQ(result.status, 0) << result.err;
     EXPECT_EQ(Store::Get().GetValue("from", ""), "stdin");

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "support/BuildTree.h"
 #include "support/TestHost.h"
 
 namespace {
@@ -87,7 +88,8 @@ BrixTest::RunResult ImportText(const BrixTest::TempHost& host, const std::string
                                const std::string& shell = "exec \"$0\" \"$@\"") {
     const fs::path file = host.Root().string() + "-import.json";
     std::ofstream(file, std::ios::trunc) << document;
-    auto result = BrixTest::Run({"sh", "-c", shell, BRIX_BIN_DIR "/brixsim", "import", file});
+    auto result = BrixTest::Run(
+        {"sh", "-c", shell, (BrixTest::BinDir() / "brixsim").string(), "import", file});
     fs::remove(file);
     return result;
 }

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "core/Store.h"
+#include "support/BuildTree.h"
 #include "support/TestHost.h"
 
 namespace {
@@ -46,7 +47,7 @@ TEST(ReadOnly, HelpAndListingsMakeNoHost) {
                                                  {"--version"},
                                                  {"system", "uuid", "get", "--help"}}) {
         std::vector<std::string> argv = {"env", "BRIX_HOST_ROOT=" + none.string(),
-                                         BRIX_BIN_DIR "/brixcli"};
+                                         (BrixTest::BinDir() / "brixcli").string()};
         argv.insert(argv.end(), args.begin(), args.end());
         EXPECT_EQ(BrixTest::Run(argv).status, 0) << args[0];
         EXPECT_FALSE(fs::exists(none)) << args[0];

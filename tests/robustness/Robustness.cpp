@@ -14,6 +14,8 @@
 #include <stdexcept>
 #include <thread>
 
+#include "support/BuildTree.h"
+
 extern char** environ;
 
 namespace BrixRobust {
@@ -91,7 +93,7 @@ int EnvCount(const char* name, int fallback) {
 }
 
 std::string Program(const std::string& name) {
-    return std::string(BRIX_BIN_DIR) + "/" + name;
+    return (BrixTest::BinDir() / name).string();
 }
 
 pid_t Spawn(const std::vector<std::string>& argv) {

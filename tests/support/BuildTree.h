@@ -1,4 +1,6 @@
-// Where the tests' build and source trees are, read from the build's CMake cache.
+// Where the tests' build and source trees are: the tests run from build/bin, and the rest is read
+// from the build's CMake cache. Nothing here is compiled in, so a test object is the same in any
+// checkout and a compiler cache serves every clone.
 #pragma once
 
 #include <filesystem>
@@ -8,9 +10,14 @@
 
 namespace BrixTest {
 
+// The folder of the programs, the test programs among them.
+inline std::filesystem::path BinDir() {
+    return std::filesystem::read_symlink("/proc/self/exe").parent_path();
+}
+
 // The build folder: the parent of build/bin.
 inline std::filesystem::path BuildDir() {
-    return std::filesystem::path(BRIX_BIN_DIR).parent_path();
+    return BinDir().parent_path();
 }
 
 // A value of the build's CMake cache, e.g. "CMAKE_HOME_DIRECTORY"; empty when it is not there.

@@ -16,6 +16,7 @@
 #include <stdexcept>
 
 #include "core/Store.h"
+#include "support/BuildTree.h"
 
 extern char** environ;
 
@@ -70,13 +71,13 @@ TempHost::~TempHost() {
 }
 
 RunResult TempHost::Cli(const std::vector<std::string>& args, const std::string& input) const {
-    std::vector<std::string> argv{BRIX_BIN_DIR "/brixcli"};
+    std::vector<std::string> argv{(BinDir() / "brixcli").string()};
     argv.insert(argv.end(), args.begin(), args.end());
     return Run(argv, input);
 }
 
 RunResult TempHost::Sim(const std::vector<std::string>& args) const {
-    std::vector<std::string> argv{BRIX_BIN_DIR "/brixsim"};
+    std::vector<std::string> argv{(BinDir() / "brixsim").string()};
     argv.insert(argv.end(), args.begin(), args.end());
     return Run(argv);
 }
