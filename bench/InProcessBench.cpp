@@ -11,8 +11,8 @@
 
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/Cli.h"
-#include "core/Registry.h"
-#include "core/Store.h"
+#include "hostsim/core/Registry.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 #include "FuzzSupport.h"
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/Cli.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -3,7 +3,7 @@
 
 #include "FuzzSupport.h"
 #include "hostctl/HostCtlException.h"
-#include "modules/ModuleStore.h"
+#include "hostsim/modules/ModuleStore.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     using namespace BrixSim::Modules;

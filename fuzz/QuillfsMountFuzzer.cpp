@@ -2,7 +2,7 @@
 #include <string>
 
 #include "FuzzSupport.h"
-#include "memfs/QuillfsMount.h"
+#include "hostsim/memfs/QuillfsMount.h"
 
 namespace {
 

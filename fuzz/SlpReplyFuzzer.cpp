@@ -3,7 +3,7 @@
 #include <memory>
 
 #include "FuzzSupport.h"
-#include "agents/slp/SlpWire.h"
+#include "hostsim/agents/slp/SlpWire.h"
 
 namespace {
 

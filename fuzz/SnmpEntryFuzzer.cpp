@@ -3,8 +3,8 @@
 #include <string>
 
 #include "FuzzSupport.h"
-#include "agents/snmp/SnmpSettings.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/agents/snmp/SnmpSettings.h"
 
 namespace {
 

@@ -10,8 +10,8 @@
 #include <vector>
 
 #include "FuzzSupport.h"
-#include "core/StateTransfer.h"
-#include "core/Store.h"
+#include "hostsim/core/StateTransfer.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

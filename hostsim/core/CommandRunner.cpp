@@ -11,7 +11,7 @@
 #include <filesystem>
 
 #include "cmdkit/AutoCli.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

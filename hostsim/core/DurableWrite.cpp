@@ -1,4 +1,4 @@
-#include "core/DurableWrite.h"
+#include "hostsim/core/DurableWrite.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>

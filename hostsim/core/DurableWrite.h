@@ -9,7 +9,7 @@
 #include <string_view>
 #include <vector>
 
-#include "core/Fd.h"
+#include "hostsim/core/Fd.h"
 
 namespace BrixSim {
 

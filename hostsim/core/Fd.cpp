@@ -1,4 +1,4 @@
-#include "core/Fd.h"
+#include "hostsim/core/Fd.h"
 
 #include <unistd.h>
 

@@ -1,4 +1,4 @@
-#include "core/FileTransfer.h"
+#include "hostsim/core/FileTransfer.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -14,7 +14,7 @@
 #include <system_error>
 #include <vector>
 
-#include "core/Fd.h"
+#include "hostsim/core/Fd.h"
 
 namespace BrixSim {
 

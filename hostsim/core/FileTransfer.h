@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "core/DurableWrite.h"
+#include "hostsim/core/DurableWrite.h"
 
 namespace BrixSim {
 

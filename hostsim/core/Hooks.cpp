@@ -3,7 +3,7 @@
 #include <set>
 #include <stdexcept>
 
-#include "core/Registry.h"
+#include "hostsim/core/Registry.h"
 
 namespace BrixSim {
 

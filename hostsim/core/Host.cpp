@@ -1,9 +1,9 @@
 // The host object and its system interface; each area defines its own SystemInfo methods.
 #include "hostctl/Host.h"
 
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/SystemInfo.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -3,7 +3,7 @@
 
 #include <exception>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -14,7 +14,7 @@
 #include <filesystem>
 #include <string>
 
-#include "core/Registry.h"
+#include "hostsim/core/Registry.h"
 #include "os/HostFiles.h"
 
 namespace {

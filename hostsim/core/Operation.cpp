@@ -1,4 +1,4 @@
-#include "core/Operation.h"
+#include "hostsim/core/Operation.h"
 
 #include <cstdio>
 #include <cstdlib>

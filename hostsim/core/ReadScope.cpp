@@ -1,7 +1,7 @@
 // A platform read scope is a hold on the store's read transaction.
 #include "hostctl/ReadScope.h"
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace HostCtl::Lib {
 

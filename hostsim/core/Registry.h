@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "core/Hooks.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Store.h"
 
 namespace BrixSim {
 

@@ -1,4 +1,4 @@
-#include "core/StagedTree.h"
+#include "hostsim/core/StagedTree.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -8,7 +8,7 @@
 #include <set>
 #include <system_error>
 
-#include "core/FileTransfer.h"
+#include "hostsim/core/FileTransfer.h"
 
 namespace BrixSim {
 

@@ -11,8 +11,8 @@
 #include <utility>
 #include <vector>
 
-#include "core/DurableWrite.h"
-#include "core/FileTransfer.h"
+#include "hostsim/core/DurableWrite.h"
+#include "hostsim/core/FileTransfer.h"
 
 namespace BrixSim {
 

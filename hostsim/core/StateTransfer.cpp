@@ -1,4 +1,4 @@
-#include "core/StateTransfer.h"
+#include "hostsim/core/StateTransfer.h"
 
 #include <algorithm>
 #include <map>
@@ -8,9 +8,9 @@
 #include <stdexcept>
 #include <vector>
 
-#include "core/FileTransfer.h"
-#include "core/StagedTree.h"
-#include "core/Store.h"
+#include "hostsim/core/FileTransfer.h"
+#include "hostsim/core/StagedTree.h"
+#include "hostsim/core/Store.h"
 
 namespace BrixSim {
 

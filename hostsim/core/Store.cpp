@@ -1,5 +1,5 @@
 // The simulated host's store: one SQLite database (WAL, durable commits) under the host root.
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 #include <fcntl.h>
 #include <sqlite3.h>
@@ -18,10 +18,10 @@
 #include <thread>
 #include <utility>
 
-#include "core/DurableWrite.h"
-#include "core/Fd.h"
-#include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/DurableWrite.h"
+#include "hostsim/core/Fd.h"
+#include "hostsim/core/Registry.h"
 
 namespace BrixSim {
 

@@ -17,7 +17,7 @@
 #include <variant>
 #include <vector>
 
-#include "core/Operation.h"
+#include "hostsim/core/Operation.h"
 
 struct sqlite3;
 struct sqlite3_stmt;

@@ -1,9 +1,9 @@
 // Kernel system-information records, answered by the node handlers the areas register.
 #include "kernctl/Sysinfo.h"
 
-#include "core/Operation.h"
-#include "core/Registry.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Registry.h"
 
 namespace {
 

@@ -6,9 +6,9 @@
 #include <random>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/coredump/DumpTargets.h"
 #include "kernctl/Storage.h"
 
 namespace {

@@ -14,11 +14,11 @@
 #include <system_error>
 
 #include "cmdkit/Text.h"
-#include "core/DurableWrite.h"
-#include "core/Fd.h"
-#include "core/Operation.h"
-#include "coredump/DumpTargets.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/DurableWrite.h"
+#include "hostsim/core/Fd.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/coredump/DumpTargets.h"
 #include "kernctl/Storage.h"
 
 namespace HostCtl {

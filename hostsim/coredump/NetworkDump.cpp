@@ -12,12 +12,12 @@
 #include <cstring>
 
 #include "cmdkit/Text.h"
-#include "core/Fd.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/Host.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/NetworkInfo.h"
+#include "hostsim/core/Fd.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

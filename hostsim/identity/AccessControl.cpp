@@ -4,9 +4,9 @@
 #include <string>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/KernAccess.h"
 
 namespace {

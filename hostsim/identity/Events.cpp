@@ -6,9 +6,9 @@
 #include <string>
 #include <string_view>
 
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "evt/EvtUser.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

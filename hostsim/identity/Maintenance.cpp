@@ -12,12 +12,12 @@
 #include <system_error>
 #include <vector>
 
-#include "core/DurableWrite.h"
-#include "core/Hooks.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
-#include "identity/HostService.h"
+#include "hostsim/core/DurableWrite.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/identity/HostService.h"
 #include "kernctl/SystemInfoImpl.h"
 
 namespace fs = std::filesystem;

@@ -6,11 +6,11 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Hooks.h"
-#include "core/KsiRecord.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/KsiRecord.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/memfs/QuillfsState.h"
 #include "kernctl/Sysinfo.h"
-#include "memfs/QuillfsState.h"
 
 namespace {
 

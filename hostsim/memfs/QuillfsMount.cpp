@@ -1,5 +1,5 @@
 // Mounting and unmounting Quillfs RAM disks.
-#include "memfs/QuillfsMount.h"
+#include "hostsim/memfs/QuillfsMount.h"
 
 #include <algorithm>
 #include <boost/algorithm/string/classification.hpp>
@@ -12,9 +12,9 @@
 #include <system_error>
 #include <vector>
 
-#include "core/Hooks.h"
-#include "core/Store.h"
-#include "memfs/QuillfsState.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/memfs/QuillfsState.h"
 
 namespace {
 

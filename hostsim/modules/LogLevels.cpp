@@ -6,13 +6,13 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/modules/ModuleStore.h"
+#include "hostsim/settings/Boot.h"
 #include "kernctl/Module.h"
 #include "kernctl/SystemInfoImpl.h"
-#include "modules/ModuleStore.h"
-#include "settings/Boot.h"
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;

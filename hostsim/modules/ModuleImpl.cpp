@@ -4,13 +4,13 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/modules/ModuleStore.h"
 #include "kernctl/Module.h"
 #include "kernctl/SystemInfoImpl.h"
-#include "modules/ModuleStore.h"
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;

@@ -5,9 +5,9 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
-#include "modules/ModuleStore.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/modules/ModuleStore.h"
 
 namespace BrixSim::Modules {
 

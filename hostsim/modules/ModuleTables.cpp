@@ -4,8 +4,8 @@
 #include <initializer_list>
 #include <string>
 
-#include "core/Hooks.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

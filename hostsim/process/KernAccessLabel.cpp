@@ -1,9 +1,9 @@
 // Labels of access-control security domains, from the host's domain table.
 #include <string>
 
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/KernAccess.h"
 
 namespace {

@@ -3,9 +3,9 @@
 #include <string>
 #include <utility>
 
-#include "core/KsiRecord.h"
-#include "core/Operation.h"
-#include "core/Store.h"
+#include "hostsim/core/KsiRecord.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/Resource.h"
 #include "kernctl/Sysinfo.h"
 #include "kernctl/SysinfoRecords.h"

@@ -7,9 +7,9 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Hooks.h"
-#include "core/KsiRecord.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/KsiRecord.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/Sysinfo.h"
 #include "kernctl/SysinfoRecords.h"
 

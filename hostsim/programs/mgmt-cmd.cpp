@@ -15,7 +15,7 @@
 #include <vector>
 
 #include "hostctl/HostCtlException.h"
-#include "identity/HostService.h"
+#include "hostsim/identity/HostService.h"
 
 namespace {
 

@@ -1,7 +1,7 @@
 // The kernel's access-control security domains: numbered slots (with gaps), each holding a named
 // domain and its enforcement level. Shared by the domain commands and the process labels.
-#include "core/Hooks.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

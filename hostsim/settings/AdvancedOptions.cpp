@@ -5,9 +5,9 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/Adv.h"
 
 using BrixSim::Store;

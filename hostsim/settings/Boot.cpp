@@ -1,6 +1,6 @@
-#include "settings/Boot.h"
+#include "hostsim/settings/Boot.h"
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace BrixSim::Kernel {
 

@@ -13,10 +13,10 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
-#include "settings/Boot.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
+#include "hostsim/settings/Boot.h"
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;

@@ -4,10 +4,10 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Hooks.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/SystemInfoImpl.h"
 
 using BrixSim::Store;

@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/Misc.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

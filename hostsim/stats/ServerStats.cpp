@@ -4,9 +4,9 @@
 
 #include <chrono>
 
-#include "core/Hooks.h"
-#include "core/Operation.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

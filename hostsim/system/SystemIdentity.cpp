@@ -3,11 +3,11 @@
 #include <algorithm>
 #include <cstring>
 
-#include "core/Hooks.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 #include "kernctl/Sysinfo.h"
 #include "kernctl/SystemInfoImpl.h"
 

@@ -4,7 +4,7 @@
 #include <random>
 
 #include "SlpResponder.h"
-#include "agents/slp/SlpWire.h"
+#include "hostsim/agents/slp/SlpWire.h"
 
 namespace {
 

@@ -2,9 +2,9 @@
 // vectors, the BER codec, and SNMPv3 messages built and read back.
 #include <gtest/gtest.h>
 
-#include "agents/snmp/Ber.h"
-#include "agents/snmp/SnmpMessages.h"
-#include "agents/snmp/UsmKeys.h"
+#include "hostsim/agents/snmp/Ber.h"
+#include "hostsim/agents/snmp/SnmpMessages.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
 
 namespace {
 

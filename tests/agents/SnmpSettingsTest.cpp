@@ -1,7 +1,7 @@
 // The SNMP configuration file's XML form: what the agent writes reads back as the same settings.
 #include <gtest/gtest.h>
 
-#include "agents/snmp/SnmpSettings.h"
+#include "hostsim/agents/snmp/SnmpSettings.h"
 
 namespace {
 

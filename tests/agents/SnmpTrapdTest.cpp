@@ -15,7 +15,7 @@
 #include <thread>
 
 #include "SnmpSupport.h"
-#include "agents/snmp/UsmKeys.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
 
 extern char** environ;
 

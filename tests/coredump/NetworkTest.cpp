@@ -10,7 +10,7 @@
 #include <thread>
 
 #include "Helpers.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 #include <fstream>
 #include <sstream>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/BuildTree.h"
 #include "support/TestHost.h"
 

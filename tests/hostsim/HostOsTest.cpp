@@ -7,8 +7,8 @@
 #include <chrono>
 #include <fstream>
 
-#include "core/Hooks.h"
-#include "core/Store.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Store.h"
 #include "os/HostOs.h"
 #include "support/TestHost.h"
 

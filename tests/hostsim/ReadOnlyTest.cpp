@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/BuildTree.h"
 #include "support/TestHost.h"
 

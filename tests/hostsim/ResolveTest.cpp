@@ -4,7 +4,7 @@
 #include <filesystem>
 #include <fstream>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -7,7 +7,7 @@
 #include <fstream>
 
 #include "cmdkit/AutoCli.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

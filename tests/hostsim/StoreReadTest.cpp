@@ -8,8 +8,8 @@
 #include <string>
 
 #include "cmdkit/Cli.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

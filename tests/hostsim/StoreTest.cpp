@@ -7,9 +7,9 @@
 #include <stdexcept>
 #include <thread>
 
-#include "core/Store.h"
 #include "hostbase/HostBase.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -1,6 +1,6 @@
 // system maintenanceMode get|set through the host's /bin/mgmt-cmd, and system shutdown.
 #include "HostStateTesting.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

@@ -4,7 +4,7 @@
 #include "HostStateTesting.h"
 #include "brixcli/SystemPlugin.h"
 #include "cmdkit/Cli.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "identity/ReadCacheGet.h"
 #include "identity/ReadCacheSet.h"
 #include "identity/Shutdown.h"

@@ -1,7 +1,7 @@
 // system shutdown reboot|poweroff: checks, then sleep, event, syslog, sleep and the signal to init.
 #include "HostStateTesting.h"
 #include "cmdkit/CallSpec.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "identity/Shutdown.h"
 
 namespace {

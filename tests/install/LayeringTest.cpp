@@ -39,7 +39,7 @@ const std::vector<Layer>& Layers() {
 std::optional<fs::path> Resolve(const fs::path& source, const Layer& layer, const fs::path& file,
                                 const std::string& include) {
     std::vector<fs::path> roots = {file.parent_path(), source / layer.folder};
-    for (const char* root : {"src", "hostsim", "platform", "include", ""}) {
+    for (const char* root : {"src", "platform", "include", ""}) {
         roots.push_back(source / root);
     }
     for (const auto& root : roots) {

@@ -9,7 +9,7 @@
 #include <random>
 
 #include "Robustness.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -22,7 +22,7 @@
 #include <vector>
 
 #include "Robustness.h"
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/TestHost.h"
 
 namespace {

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/CliJson.h"
 
 namespace {

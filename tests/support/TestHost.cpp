@@ -15,7 +15,7 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "support/BuildTree.h"
 
 extern char** environ;

@@ -17,9 +17,9 @@
 #include <vector>
 
 #include "ToolOutput.h"
-#include "core/Registry.h"
-#include "core/StateTransfer.h"
-#include "core/Store.h"
+#include "hostsim/core/Registry.h"
+#include "hostsim/core/StateTransfer.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

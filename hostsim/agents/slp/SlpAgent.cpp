@@ -28,13 +28,13 @@
 #include <set>
 #include <string>
 
-#include "agents/slp/SlpDaemon.h"
-#include "agents/slp/SlpWire.h"
 #include "cmdkit/Text.h"
-#include "core/Fd.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/agents/slp/SlpDaemon.h"
+#include "hostsim/agents/slp/SlpWire.h"
+#include "hostsim/core/Fd.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

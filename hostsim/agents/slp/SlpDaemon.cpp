@@ -1,10 +1,10 @@
-#include "agents/slp/SlpDaemon.h"
+#include "hostsim/agents/slp/SlpDaemon.h"
 
 #include <chrono>
 #include <cstdio>
 #include <string>
 
-#include "core/Store.h"
+#include "hostsim/core/Store.h"
 #include "os/HostOs.h"
 
 namespace BrixSim::Slp {

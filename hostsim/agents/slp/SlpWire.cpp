@@ -1,4 +1,4 @@
-#include "agents/slp/SlpWire.h"
+#include "hostsim/agents/slp/SlpWire.h"
 
 #include <stdexcept>
 

@@ -1,4 +1,4 @@
-#include "agents/snmp/Ber.h"
+#include "hostsim/agents/snmp/Ber.h"
 
 #include <charconv>
 #include <vector>

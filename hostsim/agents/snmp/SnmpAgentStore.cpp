@@ -16,15 +16,15 @@
 #include <optional>
 #include <sstream>
 
-#include "agents/snmp/SnmpNotifier.h"
-#include "agents/snmp/SnmpSettings.h"
-#include "agents/snmp/UsmKeys.h"
-#include "core/DurableWrite.h"
-#include "core/Hooks.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SnmpAgent.h"
+#include "hostsim/agents/snmp/SnmpNotifier.h"
+#include "hostsim/agents/snmp/SnmpSettings.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
+#include "hostsim/core/DurableWrite.h"
+#include "hostsim/core/Hooks.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 

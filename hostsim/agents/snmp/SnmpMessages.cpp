@@ -1,6 +1,6 @@
-#include "agents/snmp/SnmpMessages.h"
+#include "hostsim/agents/snmp/SnmpMessages.h"
 
-#include "agents/snmp/Ber.h"
+#include "hostsim/agents/snmp/Ber.h"
 
 namespace BrixSim::Snmp {
 

@@ -8,7 +8,7 @@
 #include <utility>
 #include <vector>
 
-#include "agents/snmp/UsmKeys.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
 
 namespace BrixSim::Snmp {
 

@@ -1,4 +1,4 @@
-#include "agents/snmp/SnmpNotifier.h"
+#include "hostsim/agents/snmp/SnmpNotifier.h"
 
 #include <arpa/inet.h>
 #include <netdb.h>
@@ -14,10 +14,10 @@
 #include <optional>
 #include <stdexcept>
 
-#include "agents/snmp/Ber.h"
-#include "agents/snmp/SnmpMessages.h"
-#include "agents/snmp/UsmKeys.h"
-#include "core/Fd.h"
+#include "hostsim/agents/snmp/Ber.h"
+#include "hostsim/agents/snmp/SnmpMessages.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
+#include "hostsim/core/Fd.h"
 
 namespace BrixSim::Snmp {
 

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "agents/snmp/SnmpSettings.h"
+#include "hostsim/agents/snmp/SnmpSettings.h"
 
 namespace BrixSim::Snmp {
 

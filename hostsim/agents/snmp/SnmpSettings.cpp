@@ -1,4 +1,4 @@
-#include "agents/snmp/SnmpSettings.h"
+#include "hostsim/agents/snmp/SnmpSettings.h"
 
 #include <algorithm>
 #include <cctype>
@@ -7,9 +7,9 @@
 #include <set>
 #include <sstream>
 
-#include "agents/snmp/Ber.h"
 #include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/agents/snmp/Ber.h"
 
 namespace BrixSim::Snmp {
 

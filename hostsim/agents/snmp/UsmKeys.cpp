@@ -1,4 +1,4 @@
-#include "agents/snmp/UsmKeys.h"
+#include "hostsim/agents/snmp/UsmKeys.h"
 
 #include <dlfcn.h>
 #include <openssl/evp.h>

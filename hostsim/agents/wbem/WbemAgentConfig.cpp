@@ -10,10 +10,10 @@
 #include <vector>
 
 #include "cmdkit/Text.h"
-#include "core/Operation.h"
-#include "core/Store.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/SystemInfo.h"
+#include "hostsim/core/Operation.h"
+#include "hostsim/core/Store.h"
 
 namespace {
 
