@@ -10,7 +10,7 @@
 #include "hostsim/core/Operation.h"
 #include "hostsim/core/Store.h"
 #include "hostsim/modules/ModuleStore.h"
-#include "hostsim/settings/Boot.h"
+#include "hostsim/core/Boot.h"
 #include "kernctl/Module.h"
 #include "kernctl/SystemInfoImpl.h"
 

@@ -16,7 +16,7 @@
 #include "hostctl/HostCtlException.h"
 #include "hostsim/core/Operation.h"
 #include "hostsim/core/Store.h"
-#include "hostsim/settings/Boot.h"
+#include "hostsim/core/Boot.h"
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;

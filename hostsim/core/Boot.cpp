@@ -1,4 +1,4 @@
-#include "hostsim/settings/Boot.h"
+#include "hostsim/core/Boot.h"
 
 #include "hostsim/core/Store.h"
 
