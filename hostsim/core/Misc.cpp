@@ -1,10 +1,11 @@
 // The host interfaces' string tokenizer.
+#include "hostctl/Misc.h"
+
 #include <boost/algorithm/string/classification.hpp>
 #include <boost/algorithm/string/split.hpp>
 #include <string>
 #include <vector>
 
-#include "hostctl/Misc.h"
 #include "hostsim/core/Operation.h"
 #include "hostsim/core/Store.h"
 

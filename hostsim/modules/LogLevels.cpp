@@ -7,10 +7,10 @@
 
 #include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Boot.h"
 #include "hostsim/core/Operation.h"
 #include "hostsim/core/Store.h"
 #include "hostsim/modules/ModuleStore.h"
-#include "hostsim/core/Boot.h"
 #include "kernctl/Module.h"
 #include "kernctl/SystemInfoImpl.h"
 

@@ -14,9 +14,9 @@
 
 #include "cmdkit/Text.h"
 #include "hostctl/HostCtlException.h"
+#include "hostsim/core/Boot.h"
 #include "hostsim/core/Operation.h"
 #include "hostsim/core/Store.h"
-#include "hostsim/core/Boot.h"
 
 using BrixSim::Store;
 using HostCtl::Lib::HostCtlException;
