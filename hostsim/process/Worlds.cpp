@@ -243,6 +243,7 @@ WorldRow ReadRow(const BrixSim::Stmt& row) {
 // costs one query, not one a world, and holds one record at a time.
 struct ListedWorld {
     uint64_t snapshot = 0;
+    std::string name;
     std::optional<WorldRow> row;
 };
 ListedWorld& Listed() {
@@ -270,7 +271,8 @@ void EachWorld(const std::vector<std::string>& instancePath,
     while (rows.Step()) {
         listed.snapshot = snapshot;
         listed.row = ReadRow(rows);
-        name(std::to_string(listed.row->id));
+        listed.name = std::to_string(listed.row->id);
+        name(listed.name);
     }
 }
 
@@ -283,9 +285,9 @@ void GetWorld(const std::vector<std::string>& instancePath, void* buffer, size_t
     const std::string& name = instancePath[0];
     ListedWorld& listed = Listed();
     std::optional<WorldRow> world;
-    if (listed.row && listed.snapshot == Store::Get().ReadSnapshot() &&
-        std::to_string(listed.row->id) == name) {
-        world = listed.row;
+    if (listed.row && listed.snapshot == Store::Get().ReadSnapshot() && listed.name == name) {
+        world = std::move(listed.row);
+        listed.row.reset();
     }
     if (!world) {
         int64_t id = 0;
